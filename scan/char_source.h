@@ -1,0 +1,93 @@
+// The character source: hands the scanner one character at a time from the
+// innermost pending macro body, else from the current source line, refilling
+// lines and popping finished files as it goes.
+//
+// Fast path: read_cursor points at the next character of the buffer being
+// read. Both kinds of buffer end in a NUL, so read_char and peek_char take a
+// non-NUL character inline; everything else (the end of a body or a line, a
+// pop, a refill, a cursor that must be derived again) goes through the
+// out-of-line slow path, which follows the stacks exactly.
+#ifndef TPLEX_SCAN_CHAR_SOURCE_H
+#define TPLEX_SCAN_CHAR_SOURCE_H
+
+#include <cstdint>
+
+#include "lex/limits.h"
+#include "tplex/lexer.h"
+
+namespace tplex {
+
+// Character codes with a fixed meaning for the scanner.
+inline constexpr std::uint8_t ch_end_of_body = 0;
+inline constexpr std::uint8_t ch_comment_open = 251;   // "/*"
+inline constexpr std::uint8_t ch_comment_close = 252;  // "*/"
+inline constexpr std::uint8_t ch_line_comment = 253;   // "//"
+inline constexpr std::uint8_t ch_end_of_input = 255;
+
+// One pending macro body. The read position is wider than a byte, so a body
+// of any length that fits (up to 2499 characters) is read to its end.
+struct macro_frame {
+    std::uint32_t read_pos;  // next character of body
+    std::uint32_t length;    // characters in body before its NUL
+    char body[text_size];
+};
+
+extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1
+extern std::uint16_t macro_depth;
+
+extern const unsigned char *read_cursor;
+
+std::uint8_t read_char_slow();
+std::uint8_t peek_char_slow();
+
+// Takes the next character.
+inline std::uint8_t read_char() {
+    std::uint8_t c = *read_cursor;
+    if (c != 0) {
+        ++read_cursor;
+        return c;
+    }
+    return read_char_slow();
+}
+
+// The character read_char would take from the current buffer, or a blank
+// where that buffer has nothing left; takes nothing.
+inline std::uint8_t peek_char() {
+    std::uint8_t c = *read_cursor;
+    return c != 0 ? c : peek_char_slow();
+}
+
+// read_char with the comment brackets folded into their marker codes.
+inline std::uint8_t next_char() {
+    std::uint8_t c = read_char();
+    if (c == '/') {
+        std::uint8_t n = peek_char();
+        if (n == '*') {
+            read_char();
+            return ch_comment_open;
+        }
+        if (n == '/') {
+            read_char();
+            return ch_line_comment;
+        }
+    } else if (c == '*' && peek_char() == '/') {
+        read_char();
+        return ch_comment_close;
+    }
+    return c;
+}
+
+// Pushes a body (at most 2499 characters are kept). 0, or
+// TPLEX_TOO_MANY_MACRO_LEVELS with the stack unchanged.
+status_code push_macro(const char *body);
+
+// The stacks are about to change, or have changed, under the character
+// source: store the read position into its frame and derive it again from
+// the stacks on the next read.
+void char_source_sync();
+// The stacks' storage is going away: drop the cursor without storing.
+void char_source_forget();
+
+}  // namespace tplex
+
+#endif
