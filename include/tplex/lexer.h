@@ -240,7 +240,10 @@ typedef struct reserved_word_record {
 #elif defined(__STDC_VERSION__) && __STDC_VERSION__ >= 201112L
 #  define TPLEX_STATIC_ASSERT(c, m) _Static_assert(c, m)
 #else
-#  define TPLEX_STATIC_ASSERT(c, m)
+#  define TPLEX_SA_CAT2(a, b) a##b
+#  define TPLEX_SA_CAT(a, b) TPLEX_SA_CAT2(a, b)
+#  define TPLEX_STATIC_ASSERT(c, m) \
+       typedef char TPLEX_SA_CAT(tplex_layout_check_, __LINE__)[(c) ? 1 : -1]
 #endif
 
 #define TPLEX_OFFSET(t, f) offsetof(t, f)
