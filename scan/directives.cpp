@@ -170,7 +170,10 @@ status_code process_hash_directive() {
 
 status_code next_token_filtered() {
     for (;;) {
-        const status_code r = scan_token();
+        // A switched-off region drops its tokens, so its names are not
+        // expanded: bodies that name bodies several times over would keep
+        // this one call busy for ever (four names 20 deep are 4^20 bodies).
+        const status_code r = scan_token(live());
         if (r == tk_hash_word) {
             const status_code d = process_hash_directive();
             if (d < 0) return d;

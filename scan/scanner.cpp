@@ -68,11 +68,11 @@ std::size_t take_ident_chars(std::size_t n) {
 }
 
 // A word: looked up, and expanded in place when it names a body.
-status_code scan_word(std::uint8_t c) {
+status_code scan_word(std::uint8_t c, bool expand) {
     tok.text[0] = upper[c];
     const std::size_t n = take_ident_chars(1);
     if (dict_lookup_token(n) != 1) tok.kind = tk_new_identifier;
-    if (tok.kind == tk_macro) return push_macro(tok.def_text1);  // 0: scan the body
+    if (tok.kind == tk_macro && expand) return push_macro(tok.def_text1);  // 0: scan the body
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
 
@@ -185,7 +185,7 @@ void skip_line_comment() {
     while (c != '\n' && c != ch_end_of_body && c != ch_end_of_input);
 }
 
-status_code scan() {
+status_code scan(bool expand) {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
@@ -194,7 +194,7 @@ status_code scan() {
         const std::uint8_t c = next_char();
         status_code result;
         if (is_letter(c)) {
-            result = scan_word(c);
+            result = scan_word(c, expand);
         } else if (is_digit(c)) {
             result = scan_number(c, false);
         } else {
@@ -270,8 +270,8 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token() {
-    const status_code result = scan();
+status_code scan_token(bool expand) {
+    const status_code result = scan(expand);
     char_source_store();  // keep the frame's read_pos true for the parser
     return result;
 }
