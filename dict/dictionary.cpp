@@ -148,6 +148,13 @@ status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) 
     return 0;
 }
 
+void dict_discard() {
+    dict_entry *e = slot_entry();
+    if (e == nullptr) return;
+    release_entry(e);
+    dict_slots[current_token.slot] = nullptr;
+}
+
 void dict_set_kind(std::uint8_t kind, std::int16_t code) {
     dict_entry *e = slot_entry();
     if (e == nullptr) return;

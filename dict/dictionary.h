@@ -56,6 +56,10 @@ status_code dict_lookup_token(std::size_t length);
 // TPLEX_MALLOC_FAILED, TPLEX_DISASTER (the slot holds another name, which
 // is never overwritten) or TPLEX_NOT_INITIALISED.
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name);
+// Takes back the insert just made into an empty slot (nothing inserted
+// since): frees the entry at current_token.slot and empties the slot, so the
+// table is exactly as it was before the insert.
+void dict_discard();
 // Changes kind and code of the entry at current_token.slot.
 void dict_set_kind(std::uint8_t kind, std::int16_t code);
 // Attaches a new definition to the entry at current_token.slot. 0,

@@ -103,6 +103,17 @@ status_code read_body(char *body, status_code &last_scan) {
     }
 }
 
+// Stores a name with its body. A name that cannot be stored whole is not
+// stored at all: a name of kind 4 without its body would expand to
+// whatever body was looked up last.
+status_code store_macro(const char *name, const char *body, status_code done) {
+    const status_code r = dict_insert(tk_macro, 0, name);
+    if (r < 0) return r;
+    if (dict_extend(body, "", "", 0, 0, 0) == 0) return done;
+    dict_discard();
+    return TPLEX_MALLOC_FAILED;
+}
+
 // #define NAME [body]. Scanner failures while the name and body are read are
 // not passed on: the record as the scanner left it counts as the token.
 status_code do_define() {
@@ -119,9 +130,10 @@ status_code do_define() {
         if (live()) {
             if (dict_lookup(name) == 1)
                 result = TPLEX_UNEXPECTED_HASH_WORD;
-            else if (name_kind == tk_new_identifier)
-                dict_insert(tk_hash_definition, 0, name);
-            else if (name_kind != tk_hash_definition)
+            else if (name_kind == tk_new_identifier) {
+                const status_code r = dict_insert(tk_hash_definition, 0, name);
+                if (r < 0) result = r;  // not stored: say so
+            } else if (name_kind != tk_hash_definition)
                 result = TPLEX_BAD_HASH_WORD;
         }
     } else if (dict_lookup(name) == 1) {
@@ -133,9 +145,8 @@ status_code do_define() {
             if (dict_lookup(name) == 1) {
                 result = TPLEX_MACRO_REDEFINED;
             } else {
-                if (live() && dict_insert(tk_macro, 0, name) == 0)
-                    dict_extend(body, "", "", 0, 0, 0);
                 result = last_scan;
+                if (live()) result = store_macro(name, body, last_scan);
             }
         }
     }
