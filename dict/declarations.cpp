@@ -60,8 +60,7 @@ status_code make_label(std::uint16_t number, std::int16_t code, std::uint8_t mod
     const bool found = dict_lookup(name) == 1;
     if (mode == 1) {
         if (found) return TPLEX_DISASTER;
-        dict_insert(tk_label, code, name);
-        return 0;
+        return dict_insert(tk_label, code, name);  // a label not stored is a failure
     }
     return found ? 0 : TPLEX_DISASTER;
 }

@@ -18,7 +18,8 @@ status_code parse_ident(std::uint8_t declare, std::uint8_t class_);
 // The next number of a class's counter (wrapping at 16 bits).
 std::uint16_t next_ident_number(std::uint8_t class_);
 // Declares (mode 1) or checks the label "$LAB-" + number in five digits.
-// 0, or TPLEX_DISASTER when a declared label exists or a checked one does not.
+// 0, TPLEX_DISASTER when a declared label exists or a checked one does not,
+// or the failure of storing a declared label (TPLEX_MALLOC_FAILED).
 status_code make_label(std::uint16_t number, std::int16_t code, std::uint8_t mode);
 // Prints every identifier of kind 12 and their number. 0 or
 // TPLEX_UNDECLARED_IDENTIFIER.
