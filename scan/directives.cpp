@@ -202,7 +202,9 @@ status_code sc_lex_init_defines(char **names, std::int32_t count) {
     for (std::int32_t i = 0; i < count; ++i) {
         if (names[i] == nullptr) continue;  // no name to define
         if (dict_lookup(names[i]) == 1) return TPLEX_ALREADY_DEFINED;
-        dict_insert(tk_hash_definition, 2, names[i]);
+        // A name that cannot be stored stops here, like one already known.
+        const status_code r = dict_insert(tk_hash_definition, 2, names[i]);
+        if (r < 0) return r;
     }
     return 0;
 }

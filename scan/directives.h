@@ -21,7 +21,9 @@ status_code next_token_filtered();
 // Runs the hash word in current_token (its code in value). 0 or more to go
 // on, or a failure code.
 status_code process_hash_directive();
-// Predefines names as kind 25, code 2. 0, or TPLEX_ALREADY_DEFINED.
+// Predefines names as kind 25, code 2. 0, or TPLEX_ALREADY_DEFINED, or the
+// failure of storing a name (TPLEX_MALLOC_FAILED), at the first name that
+// is not defined by the call; the names before it stay defined.
 status_code sc_lex_init_defines(char **names, std::int32_t count);
 
 }  // namespace tplex
