@@ -6,6 +6,8 @@
 #   tests/run.sh            everything
 #   tests/run.sh plain      only the plain build
 #   tests/run.sh sanitize   only the sanitizer build
+#   tests/run.sh fuzz       only the fuzz targets, each for TPLEX_FUZZ_SECONDS
+#                           (default 60) with clang, failing on any finding
 set -euo pipefail
 cd "$(dirname "$0")/.."
 root=$(pwd)
@@ -35,16 +37,23 @@ build_and_test() {  # name, extra cmake options...
     (cd "$dir" && ctest --output-on-failure -j "$jobs")
 }
 
+fuzz_targets() {
+    need_packages clang libclang-rt-14-dev
+    bash "$root/fuzz/run.sh" "${TPLEX_FUZZ_SECONDS:-60}"
+}
+
 need_packages cmake g++ make libgtest-dev pkg-config file
 
 what=${1:-all}
 case "$what" in
     plain)    build_and_test plain ;;
     sanitize) build_and_test sanitize -DTPLEX_SANITIZE=ON ;;
+    fuzz)     fuzz_targets ;;
     all)
         build_and_test plain
         build_and_test sanitize -DTPLEX_SANITIZE=ON
+        fuzz_targets
         ;;
-    *) echo "usage: tests/run.sh [all|plain|sanitize]" >&2; exit 2 ;;
+    *) echo "usage: tests/run.sh [all|plain|sanitize|fuzz]" >&2; exit 2 ;;
 esac
 echo "== all tests passed"
