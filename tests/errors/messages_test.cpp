@@ -7,6 +7,8 @@
 #include <memory>
 #include <string>
 
+#include "lex/lexer.h"
+#include "scan/char_source.h"
 #include "source/source_stack.h"
 #include "test_support.h"
 
@@ -121,6 +123,24 @@ TEST_F(Messages, BothOperationsKnowTheSameCodes) {
         }
     }
     EXPECT_EQ(listed, 49);
+}
+
+// The position of a file read through the lexer: CR LF arrives as LF.
+TEST(MessagesOverTheLexer, ShowTheLineBeingRead) {
+    test::TempDir tmp;
+    test::ChangeDir cd(tmp.path());
+    tmp.write("a.src", "one\r\ntwo\r\n");
+    ASSERT_EQ(lex_initialise(), TPLEX_OK);
+    ASSERT_EQ(open_source_file("a.src"), 1);
+    test::CaptureStdout before;
+    display_error(TPLEX_BAD_CHARACTER);
+    EXPECT_EQ(before.text(), heading + std::string("Bad Character\nFile: a.src    Line: 0\n"));
+    for (const char *expected = "one\nt"; *expected; ++expected) EXPECT_EQ(read_char(), *expected);
+    test::CaptureStdout after;
+    display_error(TPLEX_BAD_CHARACTER);
+    EXPECT_EQ(after.text(), heading + std::string("Bad Character\nFile: a.src    Line: 2\ntwo\n"));
+    close_sources();
+    lex_free();
 }
 
 }  // namespace

@@ -155,6 +155,16 @@ TEST(PlatformOpen, PathsAndSlots) {
     EXPECT_EQ(platform::open_source(tmp.path().c_str()), nullptr);  // a directory
     EXPECT_EQ(platform::open_source((tmp.path() + "/" + std::string(2500, 'p')).c_str()), nullptr);
 
+    // Every slot taken: the next open fails, and works again once one is free.
+    std::vector<std::FILE *> open;
+    const std::string path = tmp.path() + "/d/f.src";
+    while (std::FILE *f = platform::open_source(path.c_str())) open.push_back(f);
+    EXPECT_EQ(open.size(), 24u);
+    EXPECT_EQ(platform::close_source(open.back()), 0);
+    open.back() = platform::open_source(path.c_str());
+    EXPECT_NE(open.back(), nullptr);
+    for (std::FILE *f : open) EXPECT_EQ(platform::close_source(f), 0);
+
     // A stream closed behind the layer's back: a new stream at its address
     // reads its own bytes.
     const std::string other = tmp.write("o.src", "other\n");
@@ -165,16 +175,6 @@ TEST(PlatformOpen, PathsAndSlots) {
     file = platform::open_source(other.c_str());
     EXPECT_EQ(read_all(file, 100), (Lines{"other\n"}));
     EXPECT_EQ(platform::close_source(file), 0);
-
-    // Every slot taken: the next open fails, and works again once one is free.
-    std::vector<std::FILE *> open;
-    const std::string path = tmp.path() + "/d/f.src";
-    while (std::FILE *f = platform::open_source(path.c_str())) open.push_back(f);
-    EXPECT_EQ(open.size(), 24u);
-    EXPECT_EQ(platform::close_source(open.back()), 0);
-    open.back() = platform::open_source(path.c_str());
-    EXPECT_NE(open.back(), nullptr);
-    for (std::FILE *f : open) EXPECT_EQ(platform::close_source(f), 0);
 }
 
 }  // namespace

@@ -8,6 +8,8 @@
 #include <memory>
 #include <string>
 
+#include "lex/lexer.h"
+#include "scan/char_source.h"
 #include "test_support.h"
 
 namespace tplex {
@@ -83,8 +85,10 @@ TEST(AbsolutePath, DrivePathsAndLeadingSeparators) {
 TEST_F(SourceStack, OpensWithoutIncludeDirectories) {
     tmp_.write("main.src", "m\n");
     tmp_.write("sub/inc.src", "i\n");
+    std::strcpy(frames_[2].line_text, "left by an earlier file\n");
     expect_opened("main.src", "main.src");
-    expect_opened("sub\\inc.src", "sub\\inc.src");  // kept as given, opened with "/"
+    expect_opened("sub\\inc.src",
+                  "sub\\inc.src");  // kept as given; line text starts empty
     EXPECT_EQ(first_line(2), "i\n");
     expect_opened(tmp_.path() + "/main.src", tmp_.path() + "/main.src");
     expect_refused("none.src", TPLEX_NO_INCLUDE_DIRS);
@@ -176,6 +180,40 @@ TEST_F(SourceStack, ArgumentsAndState) {
     EXPECT_EQ(open_source_file("a.src"), TPLEX_NOT_INITIALISED);
     EXPECT_EQ(rewind_input(), TPLEX_NOT_INITIALISED);
     EXPECT_EQ(close_sources(), TPLEX_OK);
+}
+
+// rewind_input over the lexer's own state.
+class Rewind : public ::testing::Test {
+protected:
+    Rewind() : cd_(tmp_.path()) { EXPECT_EQ(lex_initialise(), TPLEX_OK); }
+    ~Rewind() override {
+        close_sources();
+        lex_free();
+    }
+    TempDir tmp_;
+    ChangeDir cd_;
+};
+
+TEST_F(Rewind, ReopensTheMainFileFoundThroughAnIncludeDirectory) {
+    tmp_.write("lib/main.src", "first\r\nsecond\n");
+    tmp_.write("lib/inc.src", "i\n");
+    ASSERT_EQ(add_include_dir("lib"), TPLEX_OK);
+    ASSERT_EQ(open_source_file("main.src"), 1);
+    ASSERT_EQ(open_source_file("inc.src"), 2);
+    EXPECT_EQ(read_char(), 'i');
+    EXPECT_EQ(rewind_input(), 1);
+    EXPECT_EQ(include_dir_count, 0);
+    EXPECT_STREQ(source_stack[1].path, "lib\\main.src");
+    EXPECT_EQ(source_stack[2].file, nullptr);
+    std::string text;
+    for (std::uint8_t c = read_char(); c != ch_end_of_input; c = read_char()) text += char(c);
+    EXPECT_EQ(text, "first\nsecond\n");
+    EXPECT_EQ(source_depth, 0);
+}
+
+TEST_F(Rewind, BeforeAnyFileTriesTheEmptyName) {
+    EXPECT_EQ(rewind_input(), TPLEX_NO_INCLUDE_DIRS);
+    EXPECT_EQ(source_depth, 0);
 }
 
 }  // namespace
