@@ -87,8 +87,8 @@ TEST_F(SourceStack, OpensWithoutIncludeDirectories) {
     tmp_.write("sub/inc.src", "i\n");
     std::strcpy(frames_[2].line_text, "left by an earlier file\n");
     expect_opened("main.src", "main.src");
-    expect_opened("sub\\inc.src",
-                  "sub\\inc.src");  // kept as given; line text starts empty
+    // Kept as given, opened with "/"; the line text starts empty.
+    expect_opened("sub\\inc.src", "sub\\inc.src");
     EXPECT_EQ(first_line(2), "i\n");
     expect_opened(tmp_.path() + "/main.src", tmp_.path() + "/main.src");
     expect_refused("none.src", TPLEX_NO_INCLUDE_DIRS);
