@@ -1222,7 +1222,8 @@ std::string macro_name(Rng &rng, const Vocabulary &vocab, std::unordered_set<std
 }
 
 // A body whose tokens survive being stored as texts: non-negative decimal
-// numbers, words, one-character operators, and a string only in front.
+// numbers, words, one-character operators after the first token, and a
+// string only in front.
 Macro make_macro_once(Rng &rng, Vocabulary &vocab, std::unordered_set<std::string> &used) {
     Macro m;
     m.name = macro_name(rng, vocab, used);
@@ -1257,11 +1258,13 @@ Macro make_macro_once(Rng &rng, Vocabulary &vocab, std::unordered_set<std::strin
         if (s.empty()) s = "none";  // "" would read as one doubled quote
         m.body.push_back(Token{kString, 0, s});
         m.body_source += "\"" + s + "\" ";
-    } else if (r < 85) {
-        add_op('(');
+    } else if (r < 85) {  // never an operator first: it would carry no text of its own
         add_word(vocab.draw(rng));
         add_op("+-*%"[rng.below(4)]);
+        add_op('(');
         add_number();
+        add_op("+-*%"[rng.below(4)]);
+        add_word(vocab.draw(rng));
         add_op(')');
     } else {
         add_word(vocab.draw(rng));
