@@ -5,9 +5,10 @@
 # them and prints one table.
 #
 #   bench/run.sh [--size 32M] [--reps 11] [--seed 1] [--callgrind-size 2M]
-#                [--no-callgrind] [--build DIR]
+#                [--no-callgrind] [--wall] [--build DIR]
 #
-# Columns: MB/s (10^6 bytes per second of wall time, median of the runs),
+# Columns: MB/s (10^6 bytes per second of the process's CPU time, or of wall
+# time with --wall, from the start of main to the end; median of the runs),
 # million tokens per second, instructions per byte (callgrind, total Ir of
 # the whole process over the bytes read, on a --callgrind-size corpus), peak
 # RSS (ru_maxrss, the largest of the runs) and the time per byte relative to
@@ -23,6 +24,8 @@ reps=11
 seed=1
 cg_size=2M
 callgrind=1
+clock=cpu_seconds
+clock_label="CPU time"
 build="$here/build"
 while [ $# -gt 0 ]; do
     case "$1" in
@@ -31,8 +34,9 @@ while [ $# -gt 0 ]; do
         --seed) seed=$2; shift 2 ;;
         --callgrind-size) cg_size=$2; shift 2 ;;
         --no-callgrind) callgrind=0; shift ;;
+        --wall) clock=seconds; clock_label="wall time"; shift ;;
         --build) build=$2; shift 2 ;;
-        -h|--help) sed -n '2,17p' "$0"; exit 0 ;;
+        -h|--help) sed -n '2,19p' "$0"; exit 0 ;;
         *) echo "run.sh: unknown option $1 (try --help)" >&2; exit 2 ;;
     esac
 done
@@ -149,6 +153,7 @@ fi
 # ---------------------------------------------------------------- timing
 echo "== timing: $reps rounds, each running every row once (mode -c)"
 results="$build/results"
+rm -rf "$results"
 mkdir -p "$results"
 times="$results/times.txt"
 : >"$times"
@@ -163,7 +168,8 @@ for ((i = 1; i <= reps; i++)); do
     for r in "${order[@]}"; do
         IFS='|' read -r label prog v <<<"$r"
         out=$(run "$prog" -c $v.tpl)
-        echo "$i|$label|$v|$(field seconds "$out")|$(field maxrss_kb "$out")|$(field tokens "$out")" >>"$times"
+        echo "$i|$label|$v|$(field $clock "$out")|$(field maxrss_kb "$out")|$(field tokens "$out")|$out" \
+            >>"$times"
     done
     printf '.'
 done
@@ -193,7 +199,7 @@ fi
 # ---------------------------------------------------------------- table
 table="$results/table.md"
 {
-    echo "corpus: $size (seed $seed); $reps rounds; callgrind on $cg_size; $(uname -m), $(nproc) cores"
+    echo "corpus: $size (seed $seed); $reps rounds; times: $clock_label; $([ $callgrind -eq 1 ] && echo "callgrind on $cg_size" || echo "no callgrind"); $(uname -m), $(nproc) cores; load $(cut -d' ' -f1-3 /proc/loadavg)"
     echo
     echo "| scanner | corpus | MB/s | Mtok/s | instr/byte | peak RSS | time/byte vs re2c |"
     echo "|---|---|---:|---:|---:|---:|---:|"
@@ -223,7 +229,8 @@ cat "$table"
 if [ -s "$results/tplex_profile.txt" ]; then
     echo
     echo "tplex profile (callgrind, plain $cg_size, self cost), top functions:"
-    awk '/Ir +file:function/ {go = 1; next} go && NF {print "  " $0; if (++n == 15) exit}' \
+    awk '/Ir +file:function/ {go = 1; next} go && /^-+$/ {next}
+         go && !NF && n {exit} go && NF {print "  " $0; if (++n == 15) exit}' \
         "$results/tplex_profile.txt"
     echo "  (full: $results/tplex_profile.txt)"
 fi
