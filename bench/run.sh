@@ -4,7 +4,7 @@
 # the corpora; checks that every scanner delivers the same tokens; then times
 # them and prints one table.
 #
-#   bench/run.sh [--size 32M] [--reps 11] [--seed 1] [--callgrind-size 2M]
+#   bench/run.sh [--size 32M] [--reps 21] [--seed 1] [--callgrind-size 2M]
 #                [--no-callgrind] [--wall] [--build DIR]
 #
 # Columns: MB/s (10^6 bytes per second of the process's CPU time, or of wall
@@ -20,7 +20,7 @@ set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
 root=$(cd "$here/.." && pwd)
 size=32M
-reps=11
+reps=21
 seed=1
 cg_size=2M
 callgrind=1
@@ -57,8 +57,9 @@ fi
 
 # ---------------------------------------------------------------- build
 echo "== building the library (Release) and the benchmark in $build"
+# Release, plus -g: the same code, with names and lines for the profile.
 cmake -S "$root" -B "$build/tplex" -DCMAKE_BUILD_TYPE=Release -DTPLEX_BUILD_TESTS=OFF \
-    -DTPLEX_BUILD_TOOLS=OFF >/dev/null
+    -DTPLEX_BUILD_TOOLS=OFF -DCMAKE_C_FLAGS=-g -DCMAKE_CXX_FLAGS=-g >/dev/null
 cmake --build "$build/tplex" -j "$jobs" >/dev/null
 cmake -S "$here" -B "$build/bench" -DTPLEX_BUILD_DIR="$build/tplex" >/dev/null
 cmake --build "$build/bench" -j "$jobs" >/dev/null
@@ -193,6 +194,10 @@ if [ $callgrind -eq 1 ]; then
     if [ $have_tplex -eq 1 ]; then
         callgrind_annotate --inclusive=no "$results/callgrind.tplex_driver.plain.out" \
             >"$results/tplex_profile.txt" 2>/dev/null || true
+        callgrind_annotate --inclusive=yes "$results/callgrind.tplex_driver.plain.out" \
+            >"$results/tplex_profile_inclusive.txt" 2>/dev/null || true
+        callgrind_annotate --auto=yes --context=2 "$results/callgrind.tplex_driver.plain.out" \
+            >"$results/tplex_profile_lines.txt" 2>/dev/null || true
     fi
 fi
 
@@ -232,5 +237,5 @@ if [ -s "$results/tplex_profile.txt" ]; then
     awk '/Ir +file:function/ {go = 1; next} go && /^-+$/ {next}
          go && !NF && n {exit} go && NF {print "  " $0; if (++n == 15) exit}' \
         "$results/tplex_profile.txt"
-    echo "  (full: $results/tplex_profile.txt)"
+    echo "  (full: $results/tplex_profile.txt; inclusive and by source line beside it)"
 fi
