@@ -211,7 +211,7 @@ void release_table_check(TableCheck &result) {
 }
 
 TableRelocation table_relocation(const TableCheck &check, std::uint32_t index) {
-    const std::uint8_t *entry = check.table + check.relocation_offset + 8 * index;
+    const std::uint8_t *entry = check.table + check.relocation_offset + std::size_t{8} * index;
     TableRelocation result{word_at(entry), word_at(entry + 4), false};
     if (result.location <= check.relocation_offset - 4 && result.location >= header_size) {
         result.is_string = word_at(check.table + result.location) == string_placeholder;

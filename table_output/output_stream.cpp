@@ -180,6 +180,9 @@ status_code EndBlock(void) {
     return TPLEX_OK;
 }
 
+// Memory output is chosen by this call, not by OpenOutput's flags, and never
+// runs beside a table file: positions recorded for the file could otherwise
+// point at bytes that went to memory.
 status_code StartMemoryOutput(void) {
     if (output_stream.file != nullptr) return TPLEX_OUT_CANNOT_OPEN;
     // Allocate before releasing, so a failure keeps the earlier image.

@@ -80,7 +80,8 @@ status_code refuse_open(bool diagnostics, const char *name) {
 }
 
 // Refuses a text that no chunk can hold (it and its NUL exceed 10000 bytes)
-// before anything is written, so the output stays usable.
+// with TPLEX_OUT_STRING_TOO_LONG before anything is written or allocated:
+// the file stays open and the output usable, since nothing went wrong in it.
 bool too_long(const char *text) {
     if (std::strlen(text) < chunk_size) return false;
     report("sg_TableOutput (StoreString): String too long\n");
@@ -202,9 +203,9 @@ extern "C" {
 //   remembered name is always the file's real name.
 status_code OpenOutput(const char *name, uint32_t flags, uint32_t tag) {
     bool diagnostics = (flags & TPLEX_OUT_DIAGNOSTICS) != 0;
-    if (output_stream.file != nullptr) return tplex::refuse_open(diagnostics, name ? name : "");
-    if (name == nullptr || std::strlen(name) >= tplex::output_name_size) {
-        return tplex::refuse_open(diagnostics, name ? name : "");
+    if (output_stream.file != nullptr || name == nullptr ||
+        std::strlen(name) >= tplex::output_name_size) {
+        return tplex::refuse_open(diagnostics, name != nullptr ? name : "");
     }
     StopMemoryOutput();  // the table file's bytes belong in the file
     tplex::set_output_switches(flags);
@@ -346,6 +347,8 @@ status_code AddToStringStore(uint32_t *out_position, const char *text) {
     return TPLEX_OK;
 }
 
+// Strings, relocations, header. Closing nothing is TPLEX_OUT_NOT_OPEN rather
+// than bytes sent nowhere; an output whose file a failure closed stays failed.
 status_code CloseOutput(void) {
     if (!table_output.open) return TPLEX_OUT_NOT_OPEN;
     if (output_stream.file == nullptr) return TPLEX_OUT_WRITE_FAILED;  // closed by a failure

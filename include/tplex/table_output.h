@@ -143,7 +143,7 @@ status_code StopMemoryOutput(void);
 /* Number of bytes in the image (0 when there is none). */
 uint32_t MemoryOutputSize(void);
 /* Copies the first min(size, MemoryOutputSize()) bytes of the image into
- * buffer and returns that number. */
+ * buffer (which must hold size bytes) and returns that number. */
 uint32_t CopyMemoryOutput(uint8_t *buffer, uint32_t size);
 /* Switches memory output off and releases the image. Always 0. */
 status_code FreeMemoryOutput(void);
