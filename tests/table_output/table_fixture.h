@@ -14,7 +14,7 @@
 #include <vector>
 
 #include "lex/memory.h"
-#include "table_output/inspector.h"
+#include "table_output/table_check.h"
 #include "table_output/references.h"
 #include "test_support.h"
 #include "tplex/table_output.h"

@@ -1,8 +1,8 @@
 // A reader for table files, raw or hex text: checks the framing, walks the
 // relocation entries and prints a summary. Never reads past the data it is
 // given; a malformed file is an error message, not a crash.
-#ifndef TPLEX_TABLE_OUTPUT_INSPECTOR_H
-#define TPLEX_TABLE_OUTPUT_INSPECTOR_H
+#ifndef TPLEX_TABLE_OUTPUT_TABLE_CHECK_H
+#define TPLEX_TABLE_OUTPUT_TABLE_CHECK_H
 
 #include <cstddef>
 #include <cstdint>

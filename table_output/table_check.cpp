@@ -1,5 +1,5 @@
 // The table file inspector. Every read is checked against the size first.
-#include "table_output/inspector.h"
+#include "table_output/table_check.h"
 
 #include <cstdarg>
 #include <cstring>
