@@ -20,12 +20,9 @@ void set_output_switches(std::uint32_t flags) {
     s.literal_backslash = (flags & TPLEX_OUT_LITERAL_BACKSLASH) != 0;
 }
 
-// Blocks are emptied with the stream too: a block left open by a failed
-// output would otherwise be measured against the next stream's offsets.
-void begin_stream() {
-    output_stream.offset = 0;
-    output_stream.block_depth = 0;
-}
+// The block stack is left as it is: the caller balances BeginBlock and
+// EndBlock within one output.
+void begin_stream() { output_stream.offset = 0; }
 
 void report(const char *format, ...) {
     if (!output_stream.diagnostics) return;

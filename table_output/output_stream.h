@@ -50,7 +50,7 @@ extern OutputStream output_stream;
 
 // Sets the five switches of OpenOutput's flags word.
 void set_output_switches(std::uint32_t flags);
-// Starts a new byte stream: offset 0, no block open.
+// Starts a new byte stream at offset 0; open blocks stay open.
 void begin_stream();
 // Prints a failure message on standard error when diagnostics are on.
 void report(const char *format, ...)

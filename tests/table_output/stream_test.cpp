@@ -57,7 +57,9 @@ TEST_F(StreamTest, Blocks) {
     for (int i = 0; i < 100; ++i) BeginBlock();
     EXPECT_EQ(BeginBlock(), TPLEX_OUT_TOO_MANY_BLOCKS);
     AbandonOutput(0);
-    open();  // a new output starts with no block open
+    open();  // blocks are the caller's to balance: a new output keeps them
+    EXPECT_EQ(BeginBlock(), TPLEX_OUT_TOO_MANY_BLOCKS);
+    for (int i = 0; i < 100; ++i) EXPECT_EQ(EndBlock(), TPLEX_OK);
     EXPECT_EQ(EndBlock(), TPLEX_OUT_NO_OPEN_BLOCK);
 }
 
