@@ -7,6 +7,7 @@
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
+#include "scan/char_source.h"
 #include "scan/scanner.h"
 #include "source/source_stack.h"
 
@@ -179,7 +180,9 @@ status_code process_hash_directive() {
     return result;
 }
 
-status_code next_token_filtered() {
+namespace {
+
+status_code filter() {
     for (;;) {
         // A switched-off region drops its tokens, so its names are not
         // expanded: bodies that name bodies several times over would keep
@@ -194,6 +197,14 @@ status_code next_token_filtered() {
         if (r == tk_end_of_line) continue;
         if (live()) return r;
     }
+}
+
+}  // namespace
+
+status_code next_token_filtered() {
+    const status_code r = filter();
+    char_source_store();  // the frame's read_pos is true whenever the parser looks
+    return r;
 }
 
 status_code sc_lex_init_defines(char **names, std::int32_t count) {
