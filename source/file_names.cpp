@@ -34,7 +34,8 @@ static_assert(char_classes.of[static_cast<unsigned char>('\\')] == in_dir,
               "backslash: directory only");
 static_assert(char_classes.of[static_cast<unsigned char>('/')] == (in_dir | in_name),
               "slash: both");
-static_assert(char_classes.of[0] == 0 && char_classes.of[0x80] == 0 && char_classes.of['$'] == 0,
+static_assert(char_classes.of[0] == 0 && char_classes.of[0x80] == 0 &&
+                  char_classes.of[static_cast<unsigned char>('$')] == 0,
               "NUL, bytes above 127 and the marker are refused");
 
 bool is_separator(char c) {
