@@ -23,6 +23,9 @@ jobs=${TPLEX_FUZZ_JOBS:-2}
 # module is not in the tree yet) is left out.
 declare -A options=(
     [lexer]="-max_len=10000 -dict=$root/fuzz/lexer.dict"
+    [table_output]="-max_len=4096"
+    [table_check]="-max_len=4096"
+    [file_names]="-max_len=1024"
 )
 targets=("$@")
 [ ${#targets[@]} -eq 0 ] && targets=("${!options[@]}")

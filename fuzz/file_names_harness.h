@@ -1,0 +1,18 @@
+// The file name rules harness. Input: a file specification, byte 0x1E, an
+// expected extension, byte 0x1E, a default name. The specification is
+// split, the marker replaced and the result validated; every part must fit
+// its field, and a specification found valid must keep to the limits and
+// character sets.
+#ifndef TPLEX_FUZZ_FILE_NAMES_HARNESS_H
+#define TPLEX_FUZZ_FILE_NAMES_HARNESS_H
+
+#include <cstddef>
+#include <cstdint>
+
+namespace tplex::fuzz {
+
+void run_file_names(const std::uint8_t *data, std::size_t size);
+
+}  // namespace tplex::fuzz
+
+#endif
