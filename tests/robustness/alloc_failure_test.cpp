@@ -4,6 +4,7 @@
 // leak nothing (the sanitizer build runs these under LeakSanitizer).
 #include <gtest/gtest.h>
 
+#include <fstream>
 #include <functional>
 #include <string>
 #include <vector>
@@ -13,6 +14,7 @@
 #include "lex/memory.h"
 #include "test_support.h"
 #include "tplex/lexer.h"
+#include "tplex/table_output.h"
 
 namespace {
 
@@ -267,6 +269,103 @@ TEST(AllocFailure, InitDefines) {
                       for (unsigned long i = 0; i < 3; ++i)
                           EXPECT_EQ(kind_of(names[i]), i + 1 < n ? tk_hash_definition : -1) << i;
                   });
+}
+
+}  // namespace
+
+// ---------------------------------------------------------------------------
+// Table output: each allocation that fails gives the module's code. A
+// failed OpenOutput leaves no output open (its empty file stays); a failure
+// inside an output closes its file, so CloseOutput refuses it and
+// AbandonOutput deletes it.
+
+namespace {
+
+bool file_exists(const std::string &path) { return std::ifstream(path).good(); }
+
+TEST(AllocFailure, OpenOutput) {
+    TempDir dir;
+    const std::string file = dir.path() + "/t.tbl";
+    int32_t r = 0;
+    walk_failures([] { FreeOutputTables(); }, [&] { r = OpenOutput(file.c_str(), 0, 7); },
+                  [&](unsigned long) {
+                      EXPECT_EQ(r, TPLEX_OUT_NO_MEMORY_TABLES);
+                      EXPECT_EQ(AbandonOutput(1), TPLEX_OUT_NOT_OPEN);
+                      EXPECT_TRUE(file_exists(file));
+                      ASSERT_EQ(OpenOutput(file.c_str(), 0, 7), 0);
+                      EXPECT_EQ(WriteUInt8(1), 0);
+                      EXPECT_EQ(CloseOutput(), 0);
+                  });
+    FreeOutputTables();
+}
+
+// An operation inside an open output, failing with one code whichever of
+// its allocations fails.
+void check_inside_output(const char *what, const std::function<int32_t()> &op, int32_t code) {
+    SCOPED_TRACE(what);
+    TempDir dir;
+    const std::string file = dir.path() + "/t.tbl";
+    int32_t r = 0;
+    walk_failures(
+        [&] {
+            AbandonOutput(1);
+            ASSERT_EQ(OpenOutput(file.c_str(), TPLEX_OUT_ALIGN, 0), 0);
+            ASSERT_EQ(StoreString("first"), 0);  // the store's chunk has bytes in it
+        },
+        [&] { r = op(); },
+        [&](unsigned long) {
+            EXPECT_EQ(r, code);
+            EXPECT_EQ(WriteUInt8(1), TPLEX_OUT_WRITE_FAILED);
+            EXPECT_EQ(CloseOutput(), TPLEX_OUT_WRITE_FAILED);
+            EXPECT_EQ(AbandonOutput(1), 0);
+            EXPECT_FALSE(file_exists(file));
+        });
+    AbandonOutput(1);
+    FreeOutputTables();
+}
+
+TEST(AllocFailure, InsideOutput) {
+    uint32_t id = 0;
+    const std::string long_text(9999, 's');
+    check_inside_output("WriteReference", [&] { return WriteReference(&id, 0); },
+                        TPLEX_OUT_NO_MEMORY_RELOC);
+    check_inside_output("StoreString", [] { return StoreString("x"); }, TPLEX_OUT_NO_MEMORY_RELOC);
+    check_inside_output("AddToStringStore, new chunk",
+                        [&] { return AddToStringStore(&id, long_text.c_str()); },
+                        TPLEX_OUT_NO_MEMORY_CHUNK);
+}
+
+// Memory output: a first chunk that cannot be had leaves memory output off
+// and the earlier image as it was; a further chunk is a failed byte.
+TEST(AllocFailure, MemoryOutput) {
+    int32_t r = 0;
+    walk_failures(
+        [] {
+            FreeMemoryOutput();
+            ASSERT_EQ(StartMemoryOutput(), 0);
+            ASSERT_EQ(WriteUInt32(0x01020304), 0);
+            StopMemoryOutput();
+        },
+        [&] { r = StartMemoryOutput(); },
+        [&](unsigned long) {
+            EXPECT_EQ(r, TPLEX_OUT_NO_MEMORY_CHUNK);
+            EXPECT_EQ(MemoryOutputSize(), 4u);
+            EXPECT_EQ(WriteUInt8(1), TPLEX_OUT_WRITE_FAILED);  // off, and no file open
+        });
+    walk_failures(
+        [] {
+            FreeMemoryOutput();
+            ASSERT_EQ(StartMemoryOutput(), 0);
+            for (int i = 0; i < 10000; ++i) ASSERT_EQ(WriteUInt8(1), 0);
+        },
+        [&] { r = WriteUInt8(2); },
+        [&](unsigned long) {
+            EXPECT_EQ(r, TPLEX_OUT_NO_MEMORY_CHUNK);
+            EXPECT_EQ(MemoryOutputSize(), 10000u);
+            EXPECT_EQ(WriteUInt8(3), 0);
+            EXPECT_EQ(MemoryOutputSize(), 10001u);
+        });
+    FreeMemoryOutput();
 }
 
 }  // namespace

@@ -12,7 +12,9 @@
 #include <string>
 #include <vector>
 
+#include "file_names_harness.h"
 #include "lexer_harness.h"
+#include "table_harness.h"
 #include "test_support.h"
 
 namespace {
@@ -46,14 +48,28 @@ std::string case_name(const ::testing::TestParamInfo<std::string> &info) {
     return name;
 }
 
-class LexerReplay : public ::testing::TestWithParam<std::string> {};
-
-TEST_P(LexerReplay, RunsClean) {
-    const std::string data = read_file(GetParam());
+void replay(void (*harness)(const std::uint8_t *, std::size_t), const std::string &file) {
+    const std::string data = read_file(file);
     tplex::test::CaptureStdout quiet;
-    tplex::fuzz::run_lexer(reinterpret_cast<const std::uint8_t *>(data.data()), data.size());
+    harness(reinterpret_cast<const std::uint8_t *>(data.data()), data.size());
 }
 
+class LexerReplay : public ::testing::TestWithParam<std::string> {};
+class TableOutputReplay : public ::testing::TestWithParam<std::string> {};
+class TableCheckReplay : public ::testing::TestWithParam<std::string> {};
+class FileNamesReplay : public ::testing::TestWithParam<std::string> {};
+
+TEST_P(LexerReplay, RunsClean) { replay(tplex::fuzz::run_lexer, GetParam()); }
+TEST_P(TableOutputReplay, RunsClean) { replay(tplex::fuzz::run_table_output, GetParam()); }
+TEST_P(TableCheckReplay, RunsClean) { replay(tplex::fuzz::run_table_check, GetParam()); }
+TEST_P(FileNamesReplay, RunsClean) { replay(tplex::fuzz::run_file_names, GetParam()); }
+
 INSTANTIATE_TEST_SUITE_P(Inputs, LexerReplay, ::testing::ValuesIn(inputs_of("lexer")), case_name);
+INSTANTIATE_TEST_SUITE_P(Inputs, TableOutputReplay, ::testing::ValuesIn(inputs_of("table_output")),
+                         case_name);
+INSTANTIATE_TEST_SUITE_P(Inputs, TableCheckReplay, ::testing::ValuesIn(inputs_of("table_check")),
+                         case_name);
+INSTANTIATE_TEST_SUITE_P(Inputs, FileNamesReplay, ::testing::ValuesIn(inputs_of("file_names")),
+                         case_name);
 
 }  // namespace

@@ -1,7 +1,8 @@
 // Lifecycle: many whole lives of the lexer (initialise, predefine, a pass
-// with includes and defines, further passes, close, free) must leave no
-// file open and, under LeakSanitizer, no memory behind; every pass over the
-// same input must give the same tokens.
+// with includes and defines, further passes, close, free) and of table
+// outputs (opened, closed, abandoned, failed, freed) must leave no file open
+// and, under LeakSanitizer, no memory behind; every pass over the same
+// input must give the same tokens.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -10,6 +11,7 @@
 
 #include "test_support.h"
 #include "tplex/lexer.h"
+#include "tplex/table_output.h"
 
 namespace {
 
@@ -111,6 +113,48 @@ TEST(Lifecycle, RepeatedInitialiseAndFree) {
     EXPECT_EQ(lex_free(), 0);
     EXPECT_EQ(sc_lex_init(), 0);
     EXPECT_EQ(lex_free(), 0);
+}
+
+// One table output of each ending: complete, abandoned, failed at close
+// and abandoned, with and without freeing the tables in between.
+void table_outputs(const std::string &dir, int round) {
+    const std::string kept = dir + "/kept.tbl", dropped = dir + "/dropped.tbl";
+    uint32_t id = 0;
+    ASSERT_EQ(OpenOutput(kept.c_str(), round % 2 == 0 ? 0 : TPLEX_OUT_HEX_TEXT, 5), 0);
+    EXPECT_EQ(WriteReference(&id, 0), 0);
+    EXPECT_EQ(StoreString("text"), 0);
+    EXPECT_EQ(DefineReferenceHere(nullptr, id, 1), 0);
+    EXPECT_EQ(WriteUInt32(7), 0);
+    EXPECT_EQ(CloseOutput(), 0);
+    EXPECT_TRUE(std::filesystem::exists(kept));
+
+    ASSERT_EQ(OpenOutput(dropped.c_str(), 0, 0), 0);
+    EXPECT_EQ(StoreString("gone"), 0);
+    EXPECT_EQ(AbandonOutput(round % 3 == 0), 0);
+    EXPECT_FALSE(std::filesystem::exists(dropped));
+
+    ASSERT_EQ(OpenOutput(dropped.c_str(), 0, 0), 0);
+    EXPECT_EQ(WriteReference(&id, 0), 0);                       // never defined
+    EXPECT_EQ(CloseOutput(), TPLEX_OUT_UNDEFINED_REFERENCE);
+    EXPECT_EQ(AbandonOutput(0), 0);
+    EXPECT_FALSE(std::filesystem::exists(dropped));
+
+    ASSERT_EQ(StartMemoryOutput(), 0);
+    EXPECT_EQ(WriteUInt32(1), 0);
+    EXPECT_EQ(FreeMemoryOutput(), 0);
+    if (round % 4 == 0) {
+        EXPECT_EQ(FreeOutputTables(), 0);
+    }
+}
+
+TEST(Lifecycle, TableOutputsLeaveNothingOpen) {
+    TempDir dir;
+    const int fds = open_fds();
+    for (int i = 0; i < 30; ++i) table_outputs(dir.path(), i);
+    EXPECT_EQ(FreeOutputTables(), 0);
+    EXPECT_EQ(FreeOutputTables(), 0);
+    EXPECT_EQ(AbandonOutput(1), TPLEX_OUT_NOT_OPEN);
+    EXPECT_EQ(open_fds(), fds);
 }
 
 }  // namespace
