@@ -2,6 +2,10 @@
 
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
@@ -34,6 +38,42 @@ std::uint16_t hash_key(const char *name, std::size_t n) {
     return h;
 }
 
+#if defined(__SSE2__)
+// The hash of a key of at most 16 characters (signed bytes are not needed:
+// the scanner's words are ASCII) followed by zero bytes to 16: the weighted
+// sum as one multiply-add over 16 lanes, with weights per length.
+struct padded_weights {
+    alignas(16) std::int16_t w[17][16];  // w[n][i]: the weight of character i of n
+    std::uint16_t bias[17];              // 48 times the weights' sum, plus 17 x 64
+};
+
+constexpr padded_weights make_padded_weights() {
+    padded_weights t{};
+    for (int n = 1; n <= 16; ++n) {
+        int sum = 0;
+        for (int i = 0; i < n; ++i) {
+            const int d = n - 1 - i;
+            t.w[n][i] = static_cast<std::int16_t>(64 >> (d % 7));
+            sum += t.w[n][i];
+        }
+        t.bias[n] = static_cast<std::uint16_t>(48 * sum + 17 * 64);
+    }
+    return t;
+}
+constexpr padded_weights weights16 = make_padded_weights();
+
+inline std::uint16_t hash_padded16(const char *key, std::size_t n) {
+    const __m128i zero = _mm_setzero_si128();
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(key));
+    const __m128i *w = reinterpret_cast<const __m128i *>(weights16.w[n]);
+    const __m128i sum = _mm_add_epi32(_mm_madd_epi16(_mm_unpacklo_epi8(x, zero), w[0]),
+                                      _mm_madd_epi16(_mm_unpackhi_epi8(x, zero), w[1]));
+    const __m128i pairs = _mm_add_epi32(sum, _mm_shuffle_epi32(sum, 0x4E));
+    const __m128i total = _mm_add_epi32(pairs, _mm_shuffle_epi32(pairs, 0xB1));
+    return static_cast<std::uint16_t>(_mm_cvtsi128_si32(total) - weights16.bias[n]);
+}
+#endif
+
 inline std::uint64_t word_at(const char *p) {
     std::uint64_t w;
     std::memcpy(&w, p, sizeof w);
@@ -49,10 +89,15 @@ inline bool same_padded(const char *a, const char *b, std::size_t n) {
 
 // The probe: the slot holding the key, or the first empty slot of its chain
 // (found false), or no_slot when every slot is taken by other names. A
-// padded key is followed by zero bytes up to a whole word.
+// padded key is ASCII followed by zero bytes up to 16 past its end.
 template <bool padded>
 std::uint16_t probe(const char *key, std::size_t n, bool &found) {
-    const std::uint16_t start = static_cast<std::uint16_t>(hash_key(key, n) % dict_slot_count);
+#if defined(__SSE2__)
+    const std::uint16_t h = padded && n >= 1 && n <= 16 ? hash_padded16(key, n) : hash_key(key, n);
+#else
+    const std::uint16_t h = hash_key(key, n);
+#endif
+    const std::uint16_t start = static_cast<std::uint16_t>(h % dict_slot_count);
     std::uint16_t s = start;
     do {
         const dict_entry *e = dict_slots[s];
@@ -149,7 +194,7 @@ struct lookup_memo {
     std::uint8_t length;
     std::uint8_t found;
 };
-constexpr int memo_bits = 9;
+constexpr int memo_bits = 10;
 constexpr std::size_t memo_max = 16;  // longer names always probe
 lookup_memo memo[1u << memo_bits];
 std::uint32_t memo_generation = 1;
@@ -229,12 +274,20 @@ status_code dict_extend(const char *text1, const char *text2, const char *text3,
     dict_entry *e = slot_entry();
     if (e == nullptr) return TPLEX_DISASTER;  // nothing looked up there to extend
     // The new texts may be copies of the old ones (the token's def_text
-    // fields), so the old definition goes only after the copy.
-    auto *d = static_cast<hash_definition *>(mem_alloc(sizeof(hash_definition)));
+    // fields), so the old definition goes only after the copy. Longer texts
+    // are cut to 2499 characters.
+    const std::size_t n1 = text1 != nullptr ? text_length(text1, text_size - 1) : 0;
+    const std::size_t n2 = text2 != nullptr ? text_length(text2, text_size - 1) : 0;
+    const std::size_t n3 = text3 != nullptr ? text_length(text3, text_size - 1) : 0;
+    auto *d = static_cast<hash_definition *>(mem_alloc(sizeof(hash_definition) + n1 + n2 + n3 + 3));
     if (d != nullptr) {
-        copy_text(d->text1, text_size, text1);  // longer texts are cut to 2499
-        copy_text(d->text2, text_size, text2);
-        copy_text(d->text3, text_size, text3);
+        char *texts = reinterpret_cast<char *>(d + 1);
+        d->text1 = texts;
+        texts += copy_text(texts, n1 + 1, text1) + 1;
+        d->text2 = texts;
+        texts += copy_text(texts, n2 + 1, text2) + 1;
+        d->text3 = texts;
+        copy_text(texts, n3 + 1, text3);
         d->flag1 = flag1;
         d->flag2 = flag2;
         d->flag3 = flag3;

@@ -3,6 +3,10 @@
 #include <array>
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
@@ -62,17 +66,44 @@ token_record &tok = current_token;
 
 // Appends the identifier characters that follow in the current buffer to
 // text (upper case), keeping at most word_max characters in all, and pads
-// the text with zero bytes for the dictionary's word-wise compare. Reading
-// straight from the buffer is what peek_char + next_char would do: an
-// identifier character is never a comment bracket, and a word ends where
-// its buffer (a line piece or a body) ends.
+// the text with 16 zero bytes for the dictionary's compare and hash.
+// Reading straight from the buffer is what peek_char + next_char would do:
+// an identifier character is never a comment bracket, and a word ends where
+// its buffer (a line piece or a body) ends. Every buffer the cursor reads
+// has 16 readable bytes from its NUL on, so 16 bytes can be looked at once.
 std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
     char *t = tok.text;
+#if defined(__SSE2__)
+    // Signed compares: bytes from 0x80 up are negative, below every bound.
+    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
+    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
+    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
+    for (;;) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const __m128i folded = _mm_or_si128(x, case_bit);
+        const __m128i letter = _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1),
+                                             _mm_cmplt_epi8(folded, z_plus_1));
+        const __m128i digit = _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1),
+                                            _mm_cmplt_epi8(x, nine_plus_1));
+        const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
+        const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
+        if (n < word_max) {  // letters lose their case bit
+            const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n), up);
+        }
+        const unsigned k = stop != 0 ? static_cast<unsigned>(__builtin_ctz(stop)) : 16u;
+        n += k;
+        p += k;
+        if (stop != 0) break;
+    }
+    if (n > word_max) n = word_max;  // the rest was read and dropped
+#else
     for (char u; n < word_max && (u = ident_upper[*p]) != 0; ++p) t[n++] = u;
     while (is_ident(*p)) ++p;  // read and dropped
+#endif
     read_cursor = p;
-    std::memset(t + n, 0, 8);
+    std::memset(t + n, 0, 16);
     return n;
 }
 
