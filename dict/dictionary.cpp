@@ -34,8 +34,23 @@ std::uint16_t hash_key(const char *name, std::size_t n) {
     return h;
 }
 
+inline std::uint64_t word_at(const char *p) {
+    std::uint64_t w;
+    std::memcpy(&w, p, sizeof w);
+    return w;
+}
+
+// Equal names, both followed by zero bytes up to a whole word.
+inline bool same_padded(const char *a, const char *b, std::size_t n) {
+    for (std::size_t i = 0; i <= n; i += 8)
+        if (word_at(a + i) != word_at(b + i)) return false;
+    return true;
+}
+
 // The probe: the slot holding the key, or the first empty slot of its chain
-// (found false), or no_slot when every slot is taken by other names.
+// (found false), or no_slot when every slot is taken by other names. A
+// padded key is followed by zero bytes up to a whole word.
+template <bool padded>
 std::uint16_t probe(const char *key, std::size_t n, bool &found) {
     const std::uint16_t start = static_cast<std::uint16_t>(hash_key(key, n) % dict_slot_count);
     std::uint16_t s = start;
@@ -45,7 +60,8 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
             found = false;
             return s;
         }
-        if (e->length == n && std::memcmp(e->name, key, n) == 0) {
+        if (e->length == n &&
+            (padded ? same_padded(e->name, key, n) : std::memcmp(e->name, key, n) == 0)) {
             found = true;
             return s;
         }
@@ -56,10 +72,10 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
 }
 
 // A found entry describes itself in current_token.
-void show_entry(const dict_entry &e) {
+void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
-    std::memmove(t.text, e.name, e.length + 1u);
+    if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
     t.value = e.code;
     if (e.definition != nullptr) {
         const hash_definition &d = *e.definition;
@@ -73,13 +89,15 @@ void show_entry(const dict_entry &e) {
     }
 }
 
+// A padded key is the token's own text, which already reads as the name.
+template <bool padded>
 status_code lookup_key(const char *key, std::size_t n) {
     current_token.has_definition = 0;
     if (dict_slots == nullptr) return 0;
     bool found = false;
-    const std::uint16_t s = probe(key, n, found);
+    const std::uint16_t s = probe<padded>(key, n, found);
     if (s == no_slot) return TPLEX_DISASTER;
-    if (found) show_entry(*dict_slots[s]);
+    if (found) show_entry(*dict_slots[s], padded);
     current_token.slot = s;
     return found ? 1 : 0;
 }
@@ -112,10 +130,57 @@ void dict_upcase(char *name) {
 
 status_code dict_lookup(char *name) {
     dict_upcase(name);
-    return lookup_key(name, key_length(name));
+    return lookup_key<false>(name, key_length(name));
 }
 
-status_code dict_lookup_token(std::size_t length) { return lookup_key(current_token.text, length); }
+namespace {
+
+// The scanner looks the same few hundred words up again and again. A small
+// direct-mapped memo remembers where each short word's probe ended, so a
+// repeated word skips the hash and the probe. An entry is valid only for the
+// generation in which it was made: a new entry in the table (which can fill
+// the free slot a remembered miss points to) or emptying the table starts a
+// new generation. Changing an entry's kind, code or definition does not: the
+// memo holds slots, and the entry itself is read on every hit.
+struct lookup_memo {
+    std::uint64_t w0, w1;  // the padded name's first 16 bytes
+    std::uint32_t generation;
+    std::uint16_t slot;
+    std::uint8_t length;
+    std::uint8_t found;
+};
+constexpr int memo_bits = 9;
+constexpr std::size_t memo_max = 16;  // longer names always probe
+lookup_memo memo[1u << memo_bits];
+std::uint32_t memo_generation = 1;
+
+inline void new_generation() {
+    if (++memo_generation == 0) {  // wrapped: forget everything
+        for (lookup_memo &m : memo) m.generation = 0;
+        memo_generation = 1;
+    }
+}
+
+}  // namespace
+
+status_code dict_lookup_token(std::size_t length) {
+    const char *key = current_token.text;
+    if (length > memo_max || dict_slots == nullptr) return lookup_key<true>(key, length);
+    const std::uint64_t w0 = word_at(key);
+    const std::uint64_t w1 = length >= 8 ? word_at(key + 8) : 0;
+    const std::uint64_t mix = (w0 * 0x9E3779B97F4A7C15ull) ^ (w1 * 0xC2B2AE3D27D4EB4Full) ^ length;
+    lookup_memo &m = memo[mix >> (64 - memo_bits)];
+    if (m.generation == memo_generation && m.length == length && m.w0 == w0 && m.w1 == w1) {
+        current_token.has_definition = 0;
+        if (m.found) show_entry(*dict_slots[m.slot], true);
+        current_token.slot = m.slot;
+        return m.found;
+    }
+    const status_code r = lookup_key<true>(key, length);
+    if (r == 0 || r == 1) m = {w0, w1, memo_generation, current_token.slot,
+                               static_cast<std::uint8_t>(length), static_cast<std::uint8_t>(r)};
+    return r;
+}
 
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) {
     if (dict_slots == nullptr) return TPLEX_NOT_INITIALISED;
@@ -128,14 +193,15 @@ status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) 
         if (e == nullptr) return TPLEX_MALLOC_FAILED;
         e->definition = nullptr;
         slot = e;
+        new_generation();
     } else if (e->length != n || std::memcmp(e->name, name, n) != 0) {
         // A stale slot (left by a lookup that found the table full, or set
         // by the caller) holds another name: never overwrite it.
         return TPLEX_DISASTER;
     }
     e->kind = kind;
+    std::memset(e->name, 0, sizeof e->name);
     std::memcpy(e->name, name, n);
-    e->name[n] = '\0';
     e->length = static_cast<std::uint8_t>(n);
     e->code = code;
     // A reused entry loses its definition; nothing else can reach it.
@@ -187,6 +253,7 @@ status_code dict_create() {
 }
 
 void dict_clear() {
+    new_generation();
     if (dict_slots == nullptr) return;
     for (int s = 0; s < dict_slot_count; ++s) {
         release_entry(dict_slots[s]);

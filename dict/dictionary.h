@@ -21,9 +21,13 @@ struct hash_definition {
     std::uint8_t flag1, flag2, flag3;
 };
 
+// Room for a name of 128 characters, its NUL and zero padding to a whole
+// number of 8-byte words, so names compare a word at a time.
+inline constexpr std::size_t name_room = (word_max + 1 + 7) / 8 * 8;
+
 struct dict_entry {
     std::uint8_t kind;
-    char name[word_max + 1];  // upper case, at most 128 characters
+    char name[name_room];  // upper case, at most 128 characters, zero-padded
     std::int16_t code;
     hash_definition *definition;  // null, or owned by the entry
     std::uint8_t length;          // characters in name
@@ -48,7 +52,8 @@ void dict_upcase(char *name);
 // an insert of this name goes (unchanged when the table is full).
 status_code dict_lookup(char *name);
 // The scanner's lookup of current_token.text, which it has already
-// upper-cased and whose length it knows. Same results as dict_lookup.
+// upper-cased, whose length (at most 128) it knows, and which it has
+// followed with at least 8 zero bytes. Same results as dict_lookup.
 status_code dict_lookup_token(std::size_t length);
 
 // Stores a name at current_token.slot: in a new entry when the slot is

@@ -52,18 +52,18 @@ constexpr int32_t keep_scanning = 0;
 token_record &tok = current_token;
 
 // Appends the identifier characters that follow in the current buffer to
-// text (upper case), keeping at most word_max characters in all. Reading
+// text (upper case), keeping at most word_max characters in all, and pads
+// the text with zero bytes for the dictionary's word-wise compare. Reading
 // straight from the buffer is what peek_char + next_char would do: an
 // identifier character is never a comment bracket, and a word ends where
 // its buffer (a line piece or a body) ends.
 std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
-    while (is_ident(*p)) {
-        if (n < word_max) tok.text[n++] = upper[*p];
-        ++p;
-    }
+    char *t = tok.text;
+    while (n < word_max && is_ident(*p)) t[n++] = upper[*p++];
+    while (is_ident(*p)) ++p;  // read and dropped
     read_cursor = p;
-    tok.text[n] = '\0';
+    std::memset(t + n, 0, 8);
     return n;
 }
 
@@ -106,6 +106,16 @@ status_code scan_number(std::uint8_t c, bool negative) {
     return tk_number;
 }
 
+// Bytes that end a plain run inside a string: the quote, the comment
+// bracket characters (the character source folds them), the ends of a
+// buffer and of input.
+constexpr std::array<bool, 256> make_string_stops() {
+    std::array<bool, 256> t{};
+    t[0] = t['"'] = t['/'] = t['*'] = t[ch_end_of_input] = true;
+    return t;
+}
+constexpr std::array<bool, 256> string_stops = make_string_stops();
+
 // A string or PDF string, the opening quote (and "<") already taken. Line
 // feeds and comment marker codes are ordinary characters here.
 status_code scan_string(bool pdf) {
@@ -113,6 +123,14 @@ status_code scan_string(bool pdf) {
     status_code result = keep_scanning;
     bool complete = false;
     while (!complete && result == keep_scanning) {
+        // A run of plain characters, straight from the buffer.
+        const unsigned char *p = read_cursor;
+        while (!string_stops[*p]) {
+            if (n < string_max) tok.text[n++] = static_cast<char>(*p);
+            ++p;
+        }
+        read_cursor = p;
+
         std::uint8_t c = next_char();
         if (c == '"') {
             if (peek_char() == '"') {
@@ -171,26 +189,50 @@ inline status_code op_pair(std::uint8_t second, int32_t pair, int32_t single) {
     return op(pair);
 }
 
-void skip_block_comment() {
-    std::uint8_t c;
-    do c = next_char();
-    while (c != ch_comment_close && c != ch_end_of_body && c != ch_end_of_input);
+// Bytes a comment cannot simply pass over: the ends of a buffer and of
+// input, the closing bytes, and the bracket characters, which the
+// character source may fold into a marker.
+constexpr std::array<bool, 256> make_block_stops() {
+    std::array<bool, 256> t{};
+    t[0] = t['/'] = t['*'] = t[ch_comment_close] = t[ch_end_of_input] = true;
+    return t;
+}
+constexpr std::array<bool, 256> block_stops = make_block_stops();
+
+// A fold never consumes a line feed, so a line comment needs no brackets.
+constexpr std::array<bool, 256> make_line_stops() {
+    std::array<bool, 256> t{};
+    t[0] = t['\n'] = t[ch_end_of_input] = true;
+    return t;
+}
+constexpr std::array<bool, 256> line_stops = make_line_stops();
+
+// Takes characters up to and including the first of the ends.
+template <std::uint8_t end1, std::uint8_t end2>
+void skip_comment(const std::array<bool, 256> &stops) {
+    for (;;) {
+        const unsigned char *p = read_cursor;
+        while (!stops[*p]) ++p;
+        read_cursor = p;
+        const std::uint8_t c = next_char();
+        if (c == end1 || c == end2 || c == ch_end_of_body || c == ch_end_of_input) return;
+    }
 }
 
-// Takes everything up to and including the line feed, so no end of line
-// follows a line comment.
-void skip_line_comment() {
-    std::uint8_t c;
-    do c = next_char();
-    while (c != '\n' && c != ch_end_of_body && c != ch_end_of_input);
-}
+// A block comment ends at "*/" (or the end of a body or of input); a line
+// comment takes its line feed, so no end of line follows it.
+void skip_block_comment() { skip_comment<ch_comment_close, ch_comment_close>(block_stops); }
+void skip_line_comment() { skip_comment<'\n', '\n'>(line_stops); }
 
-status_code scan() {
+inline status_code scan() {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
     }
     for (;;) {
+        const unsigned char *p = read_cursor;
+        while (*p == ' ' || *p == '\t') ++p;  // blanks, straight from the buffer
+        read_cursor = p;
         const std::uint8_t c = next_char();
         status_code result;
         if (is_letter(c)) {
@@ -270,10 +312,6 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token() {
-    const status_code result = scan();
-    char_source_store();  // keep the frame's read_pos true for the parser
-    return result;
-}
+status_code scan_token() { return scan(); }
 
 }  // namespace tplex
