@@ -48,10 +48,10 @@ PROTOCOL Signalling
     /* Only in traced builds: a copy of every message to the log stream. */
     TEMPLATE TraceRecord
     {
-        MESSAGE Trace VALUE 0xF0;
+        MESSAGE TraceCopy VALUE 0xF0;
         FIELD Stamp : TIMESTAMP POSITION 0 LENGTH 8;
         FIELD Mask  : UBYTE POSITION 8 VALUE TRACE_MASK;
-        GENERATE Trace TO LOG;
+        GENERATE TraceCopy TO LOG;
     }
 #endif
 }

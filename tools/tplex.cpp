@@ -167,7 +167,7 @@ public:
                                                 "hash word or an earlier -D)");
         }
         const status_code opened = sc_lex_init_file(opt.file.c_str());
-        if (opened < 0) return io_error(opt.file, opened);
+        if (opened < 0) return io_error("cannot open " + opt.file, opened);
         main_file_ = opt.file;
         for (const std::string &dir : opt.include_dirs) {
             const status_code added = tplex::add_include_dir(dir.c_str());
@@ -305,7 +305,9 @@ int run_tokens(const Options &opt) {
         session, [&](const Session &s) { print_token(s, opt.json); },
         [&](status_code code, std::string &file, long &line) {
             Diagnostic d = capture_diagnostic(code);
-            if (!d.has_position) {  // a code shown without one: where the lexer is
+            // A code shown without a position, or with none to show because
+            // no file is open any more: where the lexer is.
+            if (!d.has_position || d.file.empty()) {
                 d.file = session.file();
                 d.line = static_cast<long>(session.line());
             }
