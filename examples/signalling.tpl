@@ -60,6 +60,7 @@ PROCESS CallControl
 {
     DCL calls INT = 0;
     DCL digit CHARSTRING = '0';
+    DCL offset INT = -1;
     TIMER T303 DURATION 4000;
 
     START;
@@ -82,7 +83,7 @@ PROCESS CallControl
     STATE Proceeding;
         INPUT ConnectAck;
             RESET T303;
-            NEXTSTATE Active;
+            NEXTSTATE InCall;
         INPUT T303;
             /* no answer within the timer: give up the call */
             TASK calls = calls - 1;
@@ -90,12 +91,12 @@ PROCESS CallControl
             NEXTSTATE Idle;
     ENDSTATE;
 
-    STATE Active;
+    STATE InCall;
         INPUT Release;
             TASK calls = calls - 1;
             NEXTSTATE Idle;
         INPUT ALL;
             // anything else in a call is kept for later
-            NEXTSTATE -;
+            NEXTSTATE InCall;
     ENDSTATE;
 ENDPROCESS;
