@@ -40,6 +40,7 @@ void store_position() {
 void drop_cursor() {
     cur.owner = cursor_owner::none;
     read_cursor = end_of_buffer;
+    cursor_line_pos = nullptr;
 }
 
 void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t pos) {
@@ -47,6 +48,12 @@ void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t
     cur.index = index;
     cur.base = reinterpret_cast<const unsigned char *>(base);
     read_cursor = cur.base + pos;
+    if (owner == cursor_owner::file) {
+        cursor_line = cur.base;
+        cursor_line_pos = &source_stack[index].read_pos;
+    } else {
+        cursor_line_pos = nullptr;
+    }
 }
 
 // The frame being read, or null when no file is open (or the depth has been
@@ -65,6 +72,8 @@ inline std::uint8_t line_char(const source_frame &f) {
 }  // namespace
 
 const unsigned char *read_cursor = end_of_buffer;
+const unsigned char *cursor_line = end_of_buffer;
+std::uint16_t *cursor_line_pos = nullptr;
 
 void char_source_sync() {
     store_position();
@@ -130,7 +139,5 @@ status_code push_macro(const char *body) {
     m.length = static_cast<std::uint32_t>(copy_text(m.body, text_size, body));
     return 0;
 }
-
-void char_source_store() { store_position(); }
 
 }  // namespace tplex

@@ -36,6 +36,10 @@ extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index 
 extern std::uint16_t macro_depth;
 
 extern const unsigned char *read_cursor;
+// While the cursor reads a file's line: that line, and its frame's read_pos
+// (null otherwise), so the position can be stored back cheaply.
+extern const unsigned char *cursor_line;
+extern std::uint16_t *cursor_line_pos;
 
 std::uint8_t read_char_slow();
 std::uint8_t peek_char_slow();
@@ -85,8 +89,12 @@ status_code push_macro(const char *body);
 // source: store the read position into its frame and derive it again from
 // the stacks on the next read.
 void char_source_sync();
-// Stores the read position into its frame; the cursor stays where it is.
-void char_source_store();
+// Stores the read position into its source frame; the cursor stays where
+// it is. (A macro frame's position is internal and stored when needed.)
+inline void char_source_store() {
+    if (cursor_line_pos != nullptr)
+        *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
+}
 // The stacks' storage is going away: drop the cursor without storing.
 void char_source_forget();
 

@@ -41,6 +41,15 @@ constexpr std::array<char, 256> make_upper() {
 }
 constexpr std::array<char, 256> upper = make_upper();
 
+// An identifier character's upper-case form, 0 for any other byte.
+constexpr std::array<char, 256> make_ident_upper() {
+    std::array<char, 256> t{};
+    for (int c = 0; c < 256; ++c)
+        if (classes[c] & cc_ident) t[c] = upper[c];
+    return t;
+}
+constexpr std::array<char, 256> ident_upper = make_ident_upper();
+
 inline bool is_letter(std::uint8_t c) { return (classes[c] & cc_letter) != 0; }
 inline bool is_digit(std::uint8_t c) { return (classes[c] & cc_digit) != 0; }
 inline bool is_hex(std::uint8_t c) { return (classes[c] & cc_hex) != 0; }
@@ -60,7 +69,7 @@ token_record &tok = current_token;
 std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
     char *t = tok.text;
-    while (n < word_max && is_ident(*p)) t[n++] = upper[*p++];
+    for (char u; n < word_max && (u = ident_upper[*p]) != 0; ++p) t[n++] = u;
     while (is_ident(*p)) ++p;  // read and dropped
     read_cursor = p;
     std::memset(t + n, 0, 8);
@@ -76,6 +85,18 @@ status_code scan_word(std::uint8_t c) {
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
 
+// A digit's value in bases up to 16, or no_digit.
+constexpr std::uint8_t no_digit = 0xFF;
+constexpr std::array<std::uint8_t, 256> make_digit_values() {
+    std::array<std::uint8_t, 256> t{};
+    for (auto &v : t) v = no_digit;
+    for (int c = '0'; c <= '9'; ++c) t[c] = static_cast<std::uint8_t>(c - '0');
+    for (int c = 'A'; c <= 'F'; ++c) t[c] = t[c + 32] = static_cast<std::uint8_t>(c - 55);
+    return t;
+}
+constexpr std::array<std::uint8_t, 256> digit_values = make_digit_values();
+static_assert(digit_values['f'] == 15 && digit_values['g'] == no_digit && digit_values['9'] == 9);
+
 // A number, its first character c already taken.
 status_code scan_number(std::uint8_t c, bool negative) {
     std::uint8_t base = 10;
@@ -89,14 +110,26 @@ status_code scan_number(std::uint8_t c, bool negative) {
     }
     std::uint32_t number = 0;
     status_code result = add_digit(&number, c, base);
-    std::size_t n = 0;
-    tok.text[n++] = static_cast<char>(c);
-    for (const unsigned char *p = read_cursor; result >= 0 && is_hex(*p); ++p) {
-        result = add_digit(&number, *p, base);
-        if (n < word_max) tok.text[n++] = static_cast<char>(*p);
-        read_cursor = p + 1;
+    char *t = tok.text;
+    t[0] = static_cast<char>(c);
+    std::size_t n = 1;
+    // Hex digits follow straight from the buffer (they are never comment
+    // brackets); one that is no digit of the base is taken, kept in the
+    // text, and ends the number with a failure.
+    const unsigned char *p = read_cursor;
+    if (result >= 0) {
+        for (std::uint8_t d; (d = digit_values[*p]) != no_digit; ++p) {
+            if (n < word_max) t[n++] = static_cast<char>(*p);
+            if (d >= base) {
+                result = TPLEX_BAD_DIGIT;
+                ++p;
+                break;
+            }
+            number = number * base + d;
+        }
     }
-    tok.text[n] = '\0';
+    read_cursor = p;
+    t[n] = '\0';
     if (result < 0) {
         tok.value = static_cast<int32_t>(number);
         return result;
