@@ -78,6 +78,31 @@ Diagnostic parse_diagnostic(const std::string &text) {
     return d;
 }
 
+// Text between double quotes, with \\ \" \n \r \t, and every other byte
+// below 32 or above 126 written with the printf format `other`.
+std::string escaped(const std::string &text, const char *other) {
+    std::string out = "\"";
+    for (const char ch : text) {
+        const auto c = static_cast<unsigned char>(ch);
+        switch (c) {
+            case '\\': out += "\\\\"; break;
+            case '"': out += "\\\""; break;
+            case '\n': out += "\\n"; break;
+            case '\r': out += "\\r"; break;
+            case '\t': out += "\\t"; break;
+            default:
+                if (c < 32 || c > 126) {
+                    char code[8];
+                    std::snprintf(code, sizeof code, other, c);
+                    out += code;
+                } else {
+                    out += ch;
+                }
+        }
+    }
+    return out + "\"";
+}
+
 }  // namespace
 
 Diagnostic capture_diagnostic(status_code code) {
@@ -133,51 +158,9 @@ std::string operator_spelling(std::int32_t value) {
     }
 }
 
-std::string quoted(const std::string &text) {
-    std::string out = "\"";
-    for (const char ch : text) {
-        const auto c = static_cast<unsigned char>(ch);
-        switch (c) {
-            case '\\': out += "\\\\"; break;
-            case '"': out += "\\\""; break;
-            case '\n': out += "\\n"; break;
-            case '\r': out += "\\r"; break;
-            case '\t': out += "\\t"; break;
-            default:
-                if (c < 32 || c > 126) {
-                    char hex[5];
-                    std::snprintf(hex, sizeof hex, "\\x%02x", c);
-                    out += hex;
-                } else {
-                    out += ch;
-                }
-        }
-    }
-    return out + "\"";
-}
+std::string quoted(const std::string &text) { return escaped(text, "\\x%02x"); }
 
-std::string json_string(const std::string &text) {
-    std::string out = "\"";
-    for (const char ch : text) {
-        const auto c = static_cast<unsigned char>(ch);
-        switch (c) {
-            case '\\': out += "\\\\"; break;
-            case '"': out += "\\\""; break;
-            case '\n': out += "\\n"; break;
-            case '\r': out += "\\r"; break;
-            case '\t': out += "\\t"; break;
-            default:
-                if (c < 32 || c > 126) {
-                    char hex[7];
-                    std::snprintf(hex, sizeof hex, "\\u%04x", c);
-                    out += hex;
-                } else {
-                    out += ch;
-                }
-        }
-    }
-    return out + "\"";
-}
+std::string json_string(const std::string &text) { return escaped(text, "\\u%04x"); }
 
 std::string hex_code(status_code code) {
     char buffer[16];
