@@ -5,6 +5,7 @@
 //
 // Exit status: 0 the input lexed without a failure, 1 the input had
 // failures, 2 a usage error or a file that could not be opened.
+#include <cerrno>
 #include <cstdio>
 #include <cstring>
 #include <string>
@@ -22,6 +23,7 @@
 
 #include "scan/listing.h"
 #include "source/source_stack.h"
+#include "table_output/table_check.h"
 #include "tools/report.h"
 #include "tplex/lexer.h"
 
@@ -52,26 +54,33 @@ struct Options {
     bool all = false;   // dict --all
 };
 
+// What a command accepts besides FILE.
+enum CommandOptions : unsigned {
+    takes_lexing = 1,  // -I and -D
+    takes_json = 2,    // --json
+    takes_all = 4,     // --all
+};
+
 struct Command {
     const char *name;
     const char *usage;  // the usage line after "tplex "
     const char *help;   // what it does and its options
-    bool takes_json;
-    bool takes_all;
+    unsigned options;   // CommandOptions
     int (*run)(const Options &);
 };
 
 const char *const lexing_options =
     "  -I DIR      search DIR for #include files (up to 9, in order); with none,\n"
     "              included names are opened relative to the current directory\n"
-    "  -D NAME     predefine NAME, as #define NAME would (case does not matter)\n"
-    "  -h, --help  show this help\n";
+    "  -D NAME     predefine NAME, as #define NAME would (case does not matter)\n";
+const char *const help_option = "  -h, --help  show this help\n";
 
 void print_general_usage(std::FILE *out) {
     std::fprintf(out,
                  "usage: tplex tokens [--json] [-I DIR]... [-D NAME]... FILE\n"
                  "       tplex dict [--all] [-I DIR]... [-D NAME]... FILE\n"
                  "       tplex check [-I DIR]... [-D NAME]... FILE\n"
+                 "       tplex table FILE\n"
                  "       tplex --version | --help\n"
                  "\n"
                  "Drives the tplex lexer over FILE as the template compiler's parser does.\n"
@@ -79,6 +88,7 @@ void print_general_usage(std::FILE *out) {
                  "  tokens   print the token stream, one token or failure per line\n"
                  "  dict     lex FILE, then list the symbol dictionary\n"
                  "  check    lex FILE once, print each failure and their number\n"
+                 "  table    check a table file (raw or hex text) and summarise it\n"
                  "\n"
                  "Run 'tplex COMMAND --help' for the options of a command.\n"
                  "Exit status: 0 no failure, 1 the input had failures, 2 usage or I/O error.\n");
@@ -103,9 +113,12 @@ int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
             if (arg == "--") {
                 files_only = true;
             } else if (arg == "-h" || arg == "--help") {
-                std::printf("usage: tplex %s\n\n%s\n%s", cmd.usage, cmd.help, lexing_options);
+                std::printf("usage: tplex %s\n\n%s\n%s%s", cmd.usage, cmd.help,
+                            (cmd.options & takes_lexing) != 0 ? lexing_options : "",
+                            help_option);
                 return exit_clean;
-            } else if (arg.compare(0, 2, "-I") == 0 || arg.compare(0, 2, "-D") == 0) {
+            } else if ((cmd.options & takes_lexing) != 0 &&
+                       (arg.compare(0, 2, "-I") == 0 || arg.compare(0, 2, "-D") == 0)) {
                 std::string value = arg.substr(2);
                 if (value.empty()) {
                     if (i + 1 >= argc) return usage_error(cmd.name, arg + " needs a value");
@@ -113,9 +126,9 @@ int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
                 }
                 if (value.empty()) return usage_error(cmd.name, arg + " needs a value");
                 (arg[1] == 'I' ? opt.include_dirs : opt.defines).push_back(value);
-            } else if (arg == "--json" && cmd.takes_json) {
+            } else if (arg == "--json" && (cmd.options & takes_json) != 0) {
                 opt.json = true;
-            } else if (arg == "--all" && cmd.takes_all) {
+            } else if (arg == "--all" && (cmd.options & takes_all) != 0) {
                 opt.all = true;
             } else {
                 return usage_error(cmd.name, "unknown option '" + arg + "'");
@@ -364,6 +377,24 @@ int run_dict(const Options &opt) {
 }
 
 // ---------------------------------------------------------------------------
+// tplex table
+// ---------------------------------------------------------------------------
+
+int run_table(const Options &opt) {
+    // A file that cannot be opened is an I/O error (2), not a damaged table.
+    std::FILE *file = std::fopen(opt.file.c_str(), "rb");
+    if (file == nullptr) {
+        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, opt.file.c_str(),
+                     std::strerror(errno));
+        return exit_usage;
+    }
+    std::fclose(file);
+    const int status = tplex::inspect_table_file(opt.file.c_str(), stdout, stderr);
+    std::fflush(stdout);
+    return status == 0 ? exit_clean : exit_failures;
+}
+
+// ---------------------------------------------------------------------------
 
 const Command commands[] = {
     {"tokens", "tokens [--json] [-I DIR]... [-D NAME]... FILE",
@@ -378,18 +409,24 @@ const Command commands[] = {
      "  --json      one JSON object per line instead: {file, line, kind, name,\n"
      "              value, text} for a token, {file, line, failure, message,\n"
      "              source} for a failure\n",
-     true, false, run_tokens},
+     takes_lexing | takes_json, run_tokens},
     {"dict", "dict [--all] [-I DIR]... [-D NAME]... FILE",
      "Lexes FILE (declaring nothing; failures are printed as sg_DisplayError\n"
      "prints them), then lists the symbol dictionary: slot, kind, name. The\n"
      "listing pauses for a key every ten lines when standard input is a terminal.\n"
      "\n"
      "  --all       list the reserved words and hash words too\n",
-     false, true, run_dict},
+     takes_lexing | takes_all, run_dict},
     {"check", "check [-I DIR]... [-D NAME]... FILE",
      "Lexes FILE once, as one pass of the compiler would, prints each failure as\n"
      "sg_DisplayError prints it, then the number of failures.\n",
-     false, false, run_check},
+     takes_lexing, run_check},
+    {"table", "table FILE",
+     "Checks a table file written by the table output module, raw or as hex\n"
+     "text: the header, the string table and every relocation entry. A sound\n"
+     "file is summarised (header, body, strings, relocations); for a damaged one\n"
+     "the reason is printed on standard error and the exit status is 1.\n",
+     0, run_table},
 };
 
 }  // namespace

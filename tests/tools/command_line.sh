@@ -33,6 +33,7 @@ for cmd in tokens dict check; do
     expect 0 "^usage: tplex $cmd " "$cmd" --help
     expect 0 '^  -I DIR' "$cmd" -h
 done
+expect 0 '^usage: tplex table FILE$' table --help
 expect 0 '^  --json' tokens --help
 expect 0 '^  --all' dict --help
 
@@ -47,6 +48,7 @@ expect 2 "unknown option '--json'" check --json signalling.tpl
 expect 2 "unknown option '-x'" dict -x signalling.tpl
 expect 2 '-I needs a value' check signalling.tpl -I
 expect 2 '-D needs a value' check signalling.tpl -D
+expect 2 "unknown option '-I'" table -I include x.tbl
 
 # Files and names the lexer refuses.
 expect 2 '^tplex: cannot open nowhere.tpl: No Includes to Search for Included File$' \
@@ -56,6 +58,9 @@ expect 2 '^tplex: -D protocol: the name is already known' check -D protocol sign
 expect 2 '^tplex: -D x: the name is already known' check -D X -D x signalling.tpl
 expect 2 '^tplex: -I include: Attempting too many Includes$' \
     check -I a -I b -I c -I d -I e -I f -I g -I h -I i -I include signalling.tpl
+
+expect 2 '^tplex: cannot open nowhere.tbl: No such file or directory$' table nowhere.tbl
+expect 1 '^tplex table: signalling.tpl: ' table signalling.tpl
 
 # Accepted forms.
 expect 0 '^signalling.tpl: 0 failures$' check -Iinclude -DTRACE signalling.tpl
