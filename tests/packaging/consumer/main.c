@@ -1,4 +1,6 @@
-/* Lexes one file with the installed library and prints its token count. */
+/* Lexes one file with the installed library and prints its token count.
+ * Linked with the static archive (TPLEX_STATIC), it also calls into the
+ * table output module, which only the archive carries. */
 #include <stdio.h>
 
 #include <tplex/lexer.h>
@@ -20,6 +22,10 @@ int main(int argc, char **argv) {
     if (r < 0) sg_DisplayError(r);
     sg_closesources();
     lex_free();
+#ifdef TPLEX_STATIC
+    /* The static archive carries the table output module as well. */
+    if (FreeOutputTables() != 0) return 1;
+#endif
     printf("tplex %s: %d tokens\n", TPLEX_VERSION_STRING, tokens);
     return r < 0 ? 1 : 0;
 }
