@@ -3,8 +3,11 @@
 // sc_lex_setup, sc_lex_init_defines, sc_lex_init_file, sc_next_token until
 // the end of input, sg_closesources, lex_free) and shows what it delivers.
 //
-// Exit status: 0 the input lexed without a failure, 1 the input had
-// failures, 2 a usage error or a file that could not be opened.
+// tplex table checks a table file with the table output module's checker.
+//
+// Exit status: 0 the input lexed without a failure (a sound table file),
+// 1 the input had failures (a damaged table file), 2 a usage error or a
+// file or option that the lexer refused.
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
