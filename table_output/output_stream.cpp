@@ -190,6 +190,7 @@ status_code StartMemoryOutput(void) {
     output_stream.memory_total = 0;
     output_stream.memory = true;
     tplex::begin_stream();
+    output_stream.block_depth = 0;  // an image is a stream of its own
     return TPLEX_OK;
 }
 

@@ -1,5 +1,5 @@
 // File name rules: splitting, the default name and validation.
-#include "source/file_spec.h"
+#include "source/file_names.h"
 
 #include <gtest/gtest.h>
 
@@ -9,25 +9,26 @@
 namespace tplex {
 namespace {
 
-// Splits spec with the expected extension; checks the three parts and what
+// Splits a path with the expected extension; checks the three parts and what
 // is left of the caller's text.
-void expect_split(std::string spec, const char *ext, const char *dir, const char *name,
-                  const char *ext_part, const char *spec_after) {
+void expect_split(std::string path, const char *ext, const char *dir, const char *name,
+                  const char *ext_part, const char *path_after) {
     file_spec out;
     std::memset(&out, 'Z', sizeof out);
-    split_file_spec(spec.data(), ext, &out);
-    EXPECT_STREQ(out.dir_part, dir) << spec;
-    EXPECT_STREQ(out.name_part, name) << spec;
-    EXPECT_STREQ(out.ext_part, ext_part) << spec;
-    EXPECT_STREQ(spec.c_str(), spec_after);
+    const std::string given = path;
+    split_file_spec(path.data(), ext, &out);
+    EXPECT_STREQ(out.dir_part, dir) << given;
+    EXPECT_STREQ(out.name_part, name) << given;
+    EXPECT_STREQ(out.ext_part, ext_part) << given;
+    EXPECT_STREQ(path.c_str(), path_after);
 }
 
 std::uint8_t invalid(const std::string &dir, const std::string &name, const std::string &ext) {
-    file_spec spec{};
-    dir.copy(spec.dir_part, sizeof spec.dir_part - 1);
-    name.copy(spec.name_part, sizeof spec.name_part - 1);
-    ext.copy(spec.ext_part, sizeof spec.ext_part - 1);
-    return file_spec_invalid(&spec);
+    file_spec parts{};
+    dir.copy(parts.dir_part, sizeof parts.dir_part - 1);
+    name.copy(parts.name_part, sizeof parts.name_part - 1);
+    ext.copy(parts.ext_part, sizeof parts.ext_part - 1);
+    return file_spec_invalid(&parts);
 }
 
 TEST(FileSpec, Split) {
@@ -53,23 +54,23 @@ TEST(FileSpec, LongPartsAreCutToTheirFields) {
     expect_split(std::string(100, 'n') + ".x", "x", "", std::string(79, 'n').c_str(), "x",
                  (std::string(100, 'n') + ".x").c_str());
     expect_split("$", "0123456789abcdefghij", "", "$", "0123456789abcde", "$");
-    file_spec spec{};
-    split_file_spec(std::string(300, 'd').append("\\n").data(), "", &spec);
-    EXPECT_EQ(file_spec_invalid(&spec), 1);
+    file_spec parts{};
+    split_file_spec(std::string(300, 'd').append("\\n").data(), "", &parts);
+    EXPECT_EQ(file_spec_invalid(&parts), 1);
 }
 
 TEST(FileSpec, DefaultName) {
-    file_spec spec{};
-    split_file_spec(std::string("$").data(), "x", &spec);
-    apply_default_name(&spec, "main");
-    EXPECT_STREQ(spec.name_part, "main");
-    EXPECT_STREQ(spec.ext_part, "x");
-    apply_default_name(&spec, "other");  // only the marker is replaced
-    EXPECT_STREQ(spec.name_part, "main");
-    split_file_spec(std::string("d\\$").data(), "x", &spec);
-    apply_default_name(&spec, "main");
-    EXPECT_STREQ(spec.name_part, "main");
-    EXPECT_EQ(file_spec_invalid(&spec), 0);
+    file_spec parts{};
+    split_file_spec(std::string("$").data(), "x", &parts);
+    apply_default_name(&parts, "main");
+    EXPECT_STREQ(parts.name_part, "main");
+    EXPECT_STREQ(parts.ext_part, "x");
+    apply_default_name(&parts, "other");  // only the marker is replaced
+    EXPECT_STREQ(parts.name_part, "main");
+    split_file_spec(std::string("d\\$").data(), "x", &parts);
+    apply_default_name(&parts, "main");
+    EXPECT_STREQ(parts.name_part, "main");
+    EXPECT_EQ(file_spec_invalid(&parts), 0);
 }
 
 TEST(FileSpec, Validity) {

@@ -1,4 +1,4 @@
-#include "source/file_spec.h"
+#include "source/file_names.h"
 
 #include <cstddef>
 #include <cstring>
@@ -7,7 +7,7 @@ namespace tplex {
 
 namespace {
 
-// Character classes: which parts of a specification a byte may stand in.
+// Character classes: which parts of a path a byte may stand in.
 constexpr std::uint8_t in_dir = 1;
 constexpr std::uint8_t in_name = 2;
 
@@ -77,64 +77,64 @@ std::uint8_t bad_name_char(char c) {
     return (char_classes.of[static_cast<unsigned char>(c)] & in_name) != 0 ? 0 : 1;
 }
 
-// A null specification or expected extension reads as an empty text.
-void split_file_spec(char *spec, const char *expected_ext, file_spec *out) {
+// A null path or expected extension reads as an empty text.
+void split_file_spec(char *path, const char *expected_ext, file_spec *out) {
     if (out == nullptr) return;
     if (expected_ext == nullptr) expected_ext = "";
     out->dir_part[0] = out->name_part[0] = out->ext_part[0] = '\0';
-    if (spec == nullptr) return;
+    if (path == nullptr) return;
 
-    if (std::strcmp(spec, "$") == 0) {
-        copy_cut(out->name_part, sizeof out->name_part, spec);
+    if (std::strcmp(path, "$") == 0) {
+        copy_cut(out->name_part, sizeof out->name_part, path);
         copy_cut(out->ext_part, sizeof out->ext_part, expected_ext);
         return;
     }
 
     // The last separator splits off the directory, unless it is the first
     // character: then it stays part of the name.
-    std::size_t len = std::strlen(spec);
+    std::size_t len = std::strlen(path);
     std::size_t sep = len;
-    while (sep > 0 && !is_separator(spec[sep - 1])) --sep;
+    while (sep > 0 && !is_separator(path[sep - 1])) --sep;
     if (sep > 1) {
-        copy_cut(out->dir_part, sizeof out->dir_part, spec, sep - 1);
-        std::memmove(spec, spec + sep, len - sep + 1);
+        copy_cut(out->dir_part, sizeof out->dir_part, path, sep - 1);
+        std::memmove(path, path + sep, len - sep + 1);
         len -= sep;
     }
 
     // The last full stop starts the extension, unless it is the first
     // character. "c." has an empty extension.
-    const char *dot = std::strrchr(spec, '.');
-    if (dot == spec) dot = nullptr;
+    const char *dot = std::strrchr(path, '.');
+    if (dot == path) dot = nullptr;
     const char *found_ext = dot != nullptr ? dot + 1 : "";
 
     if (std::strcmp(found_ext, expected_ext) == 0) {
-        std::size_t name_len = dot != nullptr ? static_cast<std::size_t>(dot - spec) : len;
-        copy_cut(out->name_part, sizeof out->name_part, spec, name_len);
+        std::size_t name_len = dot != nullptr ? static_cast<std::size_t>(dot - path) : len;
+        copy_cut(out->name_part, sizeof out->name_part, path, name_len);
         copy_cut(out->ext_part, sizeof out->ext_part, expected_ext);
     } else {
-        copy_cut(out->name_part, sizeof out->name_part, spec, len);
+        copy_cut(out->name_part, sizeof out->name_part, path, len);
     }
 }
 
 // A null name changes nothing.
-void apply_default_name(file_spec *spec, const char *name) {
-    if (spec == nullptr || name == nullptr) return;
-    if (std::strcmp(spec->name_part, "$") == 0)
-        copy_cut(spec->name_part, sizeof spec->name_part, name);
+void apply_default_name(file_spec *parts, const char *name) {
+    if (parts == nullptr || name == nullptr) return;
+    if (std::strcmp(parts->name_part, "$") == 0)
+        copy_cut(parts->name_part, sizeof parts->name_part, name);
 }
 
 // A field without a NUL inside it (a record filled by hand) counts as too
 // long, so nothing is read past a field.
-std::uint8_t file_spec_invalid(const file_spec *spec) {
-    if (spec == nullptr) return 1;
-    const std::size_t dir_len = field_length(spec->dir_part, sizeof spec->dir_part);
-    const std::size_t name_len = field_length(spec->name_part, sizeof spec->name_part);
-    const std::size_t ext_len = field_length(spec->ext_part, sizeof spec->ext_part);
+std::uint8_t file_spec_invalid(const file_spec *parts) {
+    if (parts == nullptr) return 1;
+    const std::size_t dir_len = field_length(parts->dir_part, sizeof parts->dir_part);
+    const std::size_t name_len = field_length(parts->name_part, sizeof parts->name_part);
+    const std::size_t ext_len = field_length(parts->ext_part, sizeof parts->ext_part);
     if (dir_len > spec_dir_max || name_len > spec_name_max || ext_len > spec_ext_max) return 1;
     if (name_len == 0 && dir_len != 0) return 1;
-    if (!all_chars_allowed(spec->dir_part, bad_dir_char)) return 1;
-    if (!all_chars_allowed(spec->name_part, bad_name_char)) return 1;
-    if (!all_chars_allowed(spec->ext_part, bad_name_char)) return 1;
+    if (!all_chars_allowed(parts->dir_part, bad_dir_char)) return 1;
+    if (!all_chars_allowed(parts->name_part, bad_name_char)) return 1;
+    if (!all_chars_allowed(parts->ext_part, bad_name_char)) return 1;
     return 0;
 }
 

@@ -1,9 +1,9 @@
-// File name rules: a file specification split into directory, name and
+// File name rules: a file path split into directory, name and
 // extension, the "$" marker replaced by a default name, and the split parts
 // checked against fixed length limits and character sets. The source stack
 // does not use these: it opens names exactly as it receives them.
-#ifndef TPLEX_SOURCE_FILE_SPEC_H
-#define TPLEX_SOURCE_FILE_SPEC_H
+#ifndef TPLEX_SOURCE_FILE_NAMES_H
+#define TPLEX_SOURCE_FILE_NAMES_H
 
 #include <cstdint>
 
@@ -25,15 +25,15 @@ struct file_spec {
     char ext_part[spec_ext_size];    // the expected extension when split off
 };
 
-// Splits spec (changed in place: it loses its directory) into out, splitting
+// Splits path (changed in place: it loses its directory) into out, splitting
 // off the extension only when it equals expected_ext exactly. A part too long
 // for its field is cut to the field, so file_spec_invalid still refuses it.
-void split_file_spec(char *spec, const char *expected_ext, file_spec *out);
+void split_file_spec(char *path, const char *expected_ext, file_spec *out);
 // Puts name in place of a name_part that is exactly "$".
-void apply_default_name(file_spec *spec, const char *name);
+void apply_default_name(file_spec *parts, const char *name);
 // 1 when a part is too long, a name is missing after a directory, or a
 // character is not allowed where it stands; else 0.
-std::uint8_t file_spec_invalid(const file_spec *spec);
+std::uint8_t file_spec_invalid(const file_spec *parts);
 // 1 when c may not stand in a directory, else 0.
 std::uint8_t bad_dir_char(char c);
 // 1 when c may not stand in a name or an extension, else 0.
