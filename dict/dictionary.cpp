@@ -178,53 +178,8 @@ status_code dict_lookup(char *name) {
     return lookup_key<false>(name, key_length(name));
 }
 
-namespace {
-
-// The scanner looks the same few hundred words up again and again. A small
-// direct-mapped memo remembers where each short word's probe ended, so a
-// repeated word skips the hash and the probe. An entry is valid only for the
-// generation in which it was made: a new entry in the table (which can fill
-// the free slot a remembered miss points to) or emptying the table starts a
-// new generation. Changing an entry's kind, code or definition does not: the
-// memo holds slots, and the entry itself is read on every hit.
-struct lookup_memo {
-    std::uint64_t w0, w1;  // the padded name's first 16 bytes
-    std::uint32_t generation;
-    std::uint16_t slot;
-    std::uint8_t length;
-    std::uint8_t found;
-};
-constexpr int memo_bits = 10;
-constexpr std::size_t memo_max = 16;  // longer names always probe
-lookup_memo memo[1u << memo_bits];
-std::uint32_t memo_generation = 1;
-
-inline void new_generation() {
-    if (++memo_generation == 0) {  // wrapped: forget everything
-        for (lookup_memo &m : memo) m.generation = 0;
-        memo_generation = 1;
-    }
-}
-
-}  // namespace
-
 status_code dict_lookup_token(std::size_t length) {
-    const char *key = current_token.text;
-    if (length > memo_max || dict_slots == nullptr) return lookup_key<true>(key, length);
-    const std::uint64_t w0 = word_at(key);
-    const std::uint64_t w1 = length >= 8 ? word_at(key + 8) : 0;
-    const std::uint64_t mix = (w0 * 0x9E3779B97F4A7C15ull) ^ (w1 * 0xC2B2AE3D27D4EB4Full) ^ length;
-    lookup_memo &m = memo[mix >> (64 - memo_bits)];
-    if (m.generation == memo_generation && m.length == length && m.w0 == w0 && m.w1 == w1) {
-        current_token.has_definition = 0;
-        if (m.found) show_entry(*dict_slots[m.slot], true);
-        current_token.slot = m.slot;
-        return m.found;
-    }
-    const status_code r = lookup_key<true>(key, length);
-    if (r == 0 || r == 1) m = {w0, w1, memo_generation, current_token.slot,
-                               static_cast<std::uint8_t>(length), static_cast<std::uint8_t>(r)};
-    return r;
+    return lookup_key<true>(current_token.text, length);
 }
 
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) {
@@ -238,7 +193,6 @@ status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) 
         if (e == nullptr) return TPLEX_MALLOC_FAILED;
         e->definition = nullptr;
         slot = e;
-        new_generation();
     } else if (e->length != n || std::memcmp(e->name, name, n) != 0) {
         // A stale slot (left by a lookup that found the table full, or set
         // by the caller) holds another name: never overwrite it.
@@ -306,7 +260,6 @@ status_code dict_create() {
 }
 
 void dict_clear() {
-    new_generation();
     if (dict_slots == nullptr) return;
     for (int s = 0; s < dict_slot_count; ++s) {
         release_entry(dict_slots[s]);
