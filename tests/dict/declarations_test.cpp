@@ -10,6 +10,7 @@
 #include "dict/declarations.h"
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
+#include "lex/memory.h"
 #include "lex_harness.h"
 #include "test_support.h"
 
@@ -318,6 +319,62 @@ TEST(DictCheck, SlotOrderIsNotInsertionOrder) {
     CaptureStdout out;
     EXPECT_EQ(dict_check(), TPLEX_UNDECLARED_IDENTIFIER);
     EXPECT_EQ(out.text(), "\nUndeclared Identifier: A\nUndeclared Identifier: B\nNumber of Undeclared Identifiers = 2");
+}
+
+
+// ---------------------------------------------------------------- limits
+
+// Fills every free slot with names of kind 10 ("Fn"), keeping the names
+// in the source text apart.
+void fill_dictionary() {
+    int filled = 0;
+    for (int s = 0; s < 1664; ++s) filled += tplex::dict_slots[s] != nullptr;
+    for (int i = 0; filled < 1664; ++i) {
+        std::string name = "F" + std::to_string(i);
+        if (tplex::dict_lookup(name.data()) == 0) {
+            ASSERT_EQ(tplex::dict_insert(tk_new_identifier, 0, name.c_str()), 0);
+            ++filled;
+        }
+    }
+}
+
+TEST(ParseIdent, AFullDictionaryOverwritesNothing) {
+    LexSession s;
+    ASSERT_EQ(s.open("newname protocol newname"), 1);
+    fill_dictionary();
+    const std::uint16_t stale = tok().slot;
+    const std::string owner = tplex::dict_slots[stale]->name;
+    // The scanner's lookup fails: a new identifier, its slot the stale one.
+    EXPECT_EQ(ident(1, 13), err(TPLEX_DISASTER));
+    EXPECT_EQ(tok().slot, stale);
+    EXPECT_EQ(tplex::dict_slots[stale]->name, owner);
+    EXPECT_EQ(tplex::shared_class_counter, 1);  // the number was taken
+    EXPECT_EQ(ident(1, 13), err(TPLEX_IDENTIFIER_EXPECTED));  // keywords are still found
+    EXPECT_EQ(ident(0, 13), err(TPLEX_DISASTER));
+    EXPECT_EQ(tplex::dict_slots[stale]->name, owner);
+}
+
+TEST(ParseIdent, AFailedInsertUsesUpItsNumber) {
+    LexSession s;
+    ASSERT_EQ(s.open("a b c"), 1);
+    tplex::mem_fail_at(1);
+    EXPECT_EQ(ident(1, 13), err(TPLEX_MALLOC_FAILED));
+    tplex::mem_fail_at(0);
+    EXPECT_EQ(entry("A"), "absent");
+    EXPECT_EQ(ident(1, 19), "0 19:2");
+    tplex::mem_fail_at(1);
+    EXPECT_EQ(ident(0, 20), err(TPLEX_MALLOC_FAILED));
+    tplex::mem_fail_at(0);
+    EXPECT_EQ(entry("C"), "absent");
+    EXPECT_EQ(tplex::general_counter, 1);  // a use takes no number
+}
+
+TEST(ParseIdent, AClassOfZeroHidesTheNameFromTheScanner) {
+    // An entry of kind 0 keeps the scan going: the word produces no token.
+    LexSession s;
+    ASSERT_EQ(s.open("ghost ghost x"), 1);
+    EXPECT_EQ(ident(1, 0), "0 0:2");
+    EXPECT_EQ(tplex::test::describe(LexSession::next()), "id:X");
 }
 
 }  // namespace

@@ -6,6 +6,7 @@
 
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
+#include "lex/memory.h"
 #include "lex_harness.h"
 #include "scan/directives.h"
 
@@ -318,6 +319,24 @@ TEST(InitDefines, CountZeroOrLessDefinesNothing) {
     EXPECT_EQ(sc_lex_init_defines(names, -1), 0);
     EXPECT_STREQ(a, "a");
     EXPECT_EQ(entry("A"), "absent");
+}
+
+
+TEST(Define, WithoutMemoryForTheNameCopy) {
+    LexSession s;
+    ASSERT_EQ(s.open("#define X 1 2\nX"), 1);
+    tplex::mem_fail_at(1);
+    EXPECT_EQ(LexSession::next().result, TPLEX_MALLOC_FAILED);
+    tplex::mem_fail_at(0);
+    EXPECT_EQ(LexSession::all_described(), (Tokens{"n:1:1", "n:2:2", "id:X", "eof"}));
+}
+
+TEST(Define, AnInsertWithoutMemoryIsNotReported) {
+    LexSession s;
+    ASSERT_EQ(s.open("#define X 1 2\n#define Y\nX Y"), 1);
+    tplex::mem_fail_at(2);  // the name copy, then the entry
+    EXPECT_EQ(LexSession::all_described(), (Tokens{"id:X", "def:Y:0", "eof"}));
+    tplex::mem_fail_at(0);
 }
 
 }  // namespace
