@@ -339,4 +339,13 @@ TEST(Define, AnInsertWithoutMemoryIsNotReported) {
     tplex::mem_fail_at(0);
 }
 
+
+TEST(Directives, NothingAfterTheHashWord) {
+    // The name's scan meets the end of the line: the record still holds the
+    // hash word, and that is the name.
+    EXPECT_EQ(lex("#define\nX 5"), (Tokens{err(TPLEX_MACRO_REDEFINED), "n:5:5", "eof"}));
+    EXPECT_EQ(lex("#ifdef\nx\n#endif\ny"), (Tokens{err(TPLEX_BAD_HASH_WORD), "id:Y", "eof"}));
+    EXPECT_EQ(lex("#ifdef"), (Tokens{err(TPLEX_BAD_HASH_WORD), "eof"}));
+}
+
 }  // namespace

@@ -7,6 +7,7 @@
 #include "lex/lexer.h"
 #include "lex_harness.h"
 #include "scan/char_source.h"
+#include "scan/scanner.h"
 
 using namespace std::string_literals;
 using tplex::test::err;
@@ -464,6 +465,56 @@ TEST(ScannerBackToken, AFailureIsNotGivenBack) {
     back_token();
     EXPECT_EQ(tplex::test::describe(LexSession::next()), "id:ABC");
     EXPECT_EQ(LexSession::all_described(), (Tokens{"id:D", "eof"}));
+}
+
+
+// ---------------------------------------------------------------- scan_token
+
+TEST(ScanToken, EndsOfLinesAndBodiesLeaveTheRecordAlone) {
+    LexSession s;
+    ASSERT_EQ(s.open("ab\n\ncd"), 1);
+    ASSERT_EQ(tplex::push_macro("7"), 0);
+    EXPECT_EQ(tplex::scan_token(), tk_number);
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_line);  // the end of the body
+    EXPECT_EQ(tplex::test::describe(tplex::test::snapshot(tk_number)), "n:7:7");
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_line);
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_line);
+    EXPECT_EQ(tplex::test::describe(tplex::test::snapshot(tk_new_identifier)), "id:AB");
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_input);
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_input);
+}
+
+TEST(ScanToken, HashWordsAndDefinedNamesAsTheScannerSeesThem) {
+    LexSession s;
+    ASSERT_EQ(s.open("#define define Include #IFNDEF\n"), 1);
+    for (int code : {201, 201, 205, 203}) {
+        EXPECT_EQ(tplex::scan_token(), tk_hash_word);
+        EXPECT_EQ(tplex::current_token.value, code);
+    }
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_line);
+}
+
+TEST(ScanToken, ALineCommentTakesItsLineFeed) {
+    LexSession s;
+    ASSERT_EQ(s.open("a // x\nb /* \n */ c\n"), 1);
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);  // B: no end of line before it
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);  // C: the comment's line feed is inside it
+    EXPECT_EQ(tplex::scan_token(), tk_end_of_line);
+}
+
+TEST(ScanToken, TheReadPositionIsInTheFrameAfterEachScan) {
+    LexSession s;
+    ASSERT_EQ(s.open("abc def\n"), 1);
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    source_frame *frames = nullptr;
+    sc_lex_setup(nullptr, &frames, nullptr, nullptr, nullptr);
+    EXPECT_EQ(frames[1].read_pos, 3);
+    EXPECT_EQ(frames[1].line_no, 0u);
+    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    EXPECT_EQ(frames[1].read_pos, 7);
 }
 
 }  // namespace
