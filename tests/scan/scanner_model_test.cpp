@@ -1,5 +1,6 @@
-// scan_token against a literal model of the character source and the
-// scanner as the behaviour description states them (one character at a
+// scan_token and sc_next_token against a literal model of the character
+// source, the scanner and the directive filter as the behaviour
+// description states them (one character at a
 // time through read_char, peek_char and next_char), on generated inputs:
 // files, an included file, bodies of names defined with a body, long lines,
 // NUL bytes and the marker bytes. Whatever the scanner does to be fast, its
@@ -16,6 +17,7 @@
 #include "lex/lexer.h"
 #include "lex_harness.h"
 #include "scan/scanner.h"
+#include "scan/directives.h"
 #include "source/source_stack.h"
 
 using tplex::test::LexSession;
@@ -286,6 +288,125 @@ struct Model {
         // The model's own record text is upper case for words (lookup did it).
         return result;
     }
+
+    // ---- the preprocessing layer (no #include: the inputs have none)
+    std::uint8_t flags[21] = {1};
+    int depth = 0;
+    bool live() const { return flags[depth] == 1; }
+
+    int lookup_name(std::string &name) {
+        char buf[2500];
+        std::snprintf(buf, sizeof buf, "%s", name.c_str());
+        const int r = tplex::dict_lookup(buf);
+        name = buf;
+        if (r == 1) {
+            rec.kind = tplex::current_token.kind;
+            rec.value = tplex::current_token.value;
+            rec.text = tplex::current_token.text;
+            if (tplex::current_token.has_definition) rec.def1 = tplex::current_token.def_text1;
+        }
+        return r;
+    }
+    void insert(std::uint8_t kind, std::int16_t code, const std::string &name) {
+        if (tplex::dict_insert(kind, code, name.c_str()) == 0) {
+            rec.kind = kind;
+            rec.value = code;
+            rec.text = name.substr(0, 128);
+        }
+    }
+
+    std::int32_t define() {
+        scan();
+        std::string name = rec.text;
+        const std::uint16_t name_kind = rec.kind;
+        const std::int32_t r = scan();
+        if (r == 36) {
+            if (!live()) return 36;
+            if (lookup_name(name) == 1) return TPLEX_UNEXPECTED_HASH_WORD;
+            if (name_kind == 10) {
+                insert(25, 0, name);
+                return 36;
+            }
+            return name_kind != 25 ? TPLEX_BAD_HASH_WORD : 36;
+        }
+        if (lookup_name(name) == 1) return TPLEX_MACRO_REDEFINED;
+        std::string body;
+        if (rec.kind == 2) {
+            if (rec.text.size() + 3 > 2499) return TPLEX_MACRO_TOO_LONG;
+            body = "\"" + rec.text + "\" ";
+        } else {
+            if (rec.text.size() + 1 > 2499) return TPLEX_MACRO_TOO_LONG;
+            body = rec.text + " ";
+        }
+        std::int32_t last;
+        for (;;) {
+            last = scan();
+            if (last == 36 || last == 5) break;
+            if (body.size() + rec.text.size() + 2 >= 2500) return TPLEX_MACRO_TOO_LONG;
+            switch (rec.kind) {
+                case 1: case 2: case 9: case 10: case 33: body += rec.text; break;
+                case 3: body.push_back(static_cast<char>(rec.value & 0xFF)); break;
+                default: return TPLEX_MACRO_BAD_TOKEN;
+            }
+            body += " ";
+        }
+        if (lookup_name(name) == 1) return TPLEX_MACRO_REDEFINED;
+        if (live()) {
+            if (tplex::dict_insert(4, 0, name.c_str()) == 0) {
+                rec.kind = 4;
+                rec.value = 0;
+                rec.text = name.substr(0, 128);
+                tplex::dict_extend(body.c_str(), "", "", 0, 0, 0);
+            }
+        }
+        return last;
+    }
+
+    std::int32_t directive() {
+        std::int32_t result = 0;
+        bool push = false;
+        std::uint8_t flag = 0;
+        switch (static_cast<std::uint32_t>(rec.value) - 201u) {
+            case 0: result = define(); break;
+            case 1:
+            case 2: {
+                const bool want_defined = rec.value == 202;
+                push = true;
+                result = scan();
+                if (live()) {
+                    if (rec.kind == 10) flag = want_defined ? 0 : 1;
+                    else if (rec.kind == 25) flag = want_defined ? 1 : 0;
+                    else result = TPLEX_BAD_HASH_WORD;
+                }
+                break;
+            }
+            case 3:
+                if (depth > 0) --depth;
+                else result = TPLEX_EXTRA_ENDIF;
+                break;
+            case 4: result = -1; break;  // not generated
+            default: result = TPLEX_UNEXPECTED_HASH_WORD; break;
+        }
+        if (push) {
+            if (depth >= 20) result = TPLEX_TOO_MANY_COND_LEVELS;
+            else flags[++depth] = flag;
+        }
+        return result;
+    }
+
+    std::int32_t filtered() {
+        for (;;) {
+            const std::int32_t r = scan();
+            if (r == 24) {
+                const std::int32_t d = directive();
+                if (d < 0) return d;
+                continue;
+            }
+            if (r == 5) return 5;
+            if (r == 36) continue;
+            if (live()) return r;
+        }
+    }
 };
 
 // ------------------------------------------------------------ inputs
@@ -430,6 +551,72 @@ TEST(ScannerModel, BodiesThatNameThemselves) {
     c.main = "m1 m2 m3 x";
     c.bodies = {"m1 ", "a m2", "m1 m3"};
     check(c, "recursive");
+}
+
+
+const char *const directive_pieces[] = {
+    "#define ", "define ", "#ifdef ", "#ifndef ", "#endif", "endif ", "ifdef ", "k1", "k2", "K3", "m1", "M2",
+    "5", "0x1", "\"s\"", "\"\"", "<\"p\">", "'c'", "+", "<=", "-", "-1", "protocol", "\n", "\n", "\n", " ",
+    " ", "//", "/*", "*/", "$", "12ab", "#foo", "\xff",
+};
+
+std::string random_directives(std::mt19937 &rng, int max_pieces) {
+    std::uniform_int_distribution<int> count(0, max_pieces);
+    std::uniform_int_distribution<std::size_t> pick(0, sizeof directive_pieces / sizeof directive_pieces[0] - 1);
+    std::string out;
+    const int n = count(rng);
+    for (int i = 0; i < n; ++i) out += directive_pieces[pick(rng)];
+    return out;
+}
+
+TEST(FilterModel, GeneratedDirectives) {
+    std::mt19937 rng(201205);
+    for (int n = 0; n < 2000; ++n) {
+        const std::string text = random_directives(rng, 60);
+        std::vector<std::string> model_trace, real_trace;
+        int model_depth = 0;
+        {
+            TempDir dir;
+            const std::string main = dir.write("main.src", text);
+            LexSession s;
+            Model m;
+            m.rec = Record{tplex::current_token.kind, tplex::current_token.value, tplex::current_token.text,
+                           tplex::current_token.def_text1};
+            m.files.emplace_back();
+            m.files.back().f = std::fopen(main.c_str(), "r");
+            int ends = 0;
+            for (int i = 0; i < 300 && ends < 2; ++i) {
+                const std::int32_t r = m.filtered();
+                model_trace.push_back(show(r, m.rec));
+                ends += r == 5;
+            }
+            model_depth = m.depth;
+        }
+        {
+            TempDir dir;
+            const std::string main = dir.write("main.src", text);
+            LexSession s;
+            ASSERT_EQ(sc_lex_init_file(main.c_str()), 1);
+            int ends = 0;
+            for (int i = 0; i < 300 && ends < 2; ++i) {
+                const std::int32_t r = sc_next_token();
+                const token_record &t = tplex::current_token;
+                real_trace.push_back(show(r, Record{t.kind, t.value, t.text, ""}));
+                ends += r == 5;
+            }
+            EXPECT_EQ(static_cast<int>(tplex::cond_depth), model_depth) << "case " << n;
+        }
+        std::size_t i = 0;
+        while (i < model_trace.size() && i < real_trace.size() && model_trace[i] == real_trace[i]) ++i;
+        if (i != model_trace.size() || i != real_trace.size()) {
+            ADD_FAILURE() << "case " << n << ": first difference at call " << i << "\n  model: "
+                          << (i < model_trace.size() ? model_trace[i] : "(none)") << "\n  real:  "
+                          << (i < real_trace.size() ? real_trace[i] : "(none)") << "\n  text: "
+                          << show(0, Record{0, 0, text, ""});
+            return;
+        }
+        if (HasFailure()) return;
+    }
 }
 
 }  // namespace
