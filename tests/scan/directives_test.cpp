@@ -348,4 +348,16 @@ TEST(Directives, NothingAfterTheHashWord) {
     EXPECT_EQ(lex("#ifdef"), (Tokens{err(TPLEX_BAD_HASH_WORD), "eof"}));
 }
 
+
+TEST(Include, ADefineOnTheLastLineOfAFileWithoutALineFeed) {
+    // The file's last character is followed directly by the includer's next
+    // line, so that line becomes the body: DEBUG is a name with the body
+    // "IFDEF DEBUG ", the #ifdef never runs and its #endif has no region.
+    LexSession s;
+    const std::string inc = s.file("config.src", "#define DEBUG");
+    ASSERT_EQ(s.open("#include \"" + inc + "\"\n#ifdef DEBUG\nx\n#endif\ny"), 1);
+    EXPECT_EQ(LexSession::all_described(), (Tokens{"id:X", err(TPLEX_EXTRA_ENDIF), "id:Y", "eof"}));
+    EXPECT_EQ(entry("DEBUG"), "4:0|IFDEF DEBUG ");
+}
+
 }  // namespace
