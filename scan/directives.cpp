@@ -173,7 +173,7 @@ namespace {
 
 status_code filter() {
     for (;;) {
-        const status_code r = scan_token();
+        const status_code r = scan_token_past_line_ends();
         if (r == tk_hash_word) {
             const status_code d = process_hash_directive();
             if (d < 0) return d;
