@@ -2,6 +2,10 @@
 
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
@@ -34,6 +38,56 @@ std::uint16_t hash_key(const char *name, std::size_t n) {
     return h;
 }
 
+#if defined(__SSE2__)
+// The hash of an ASCII key followed by 16 zero bytes, 16 characters at a
+// time as one multiply-add. Character i of n weighs 64 >> ((n - 1 - i) % 7),
+// so the chunk that starts at character s is weighted by row (n - 1 - s) % 7
+// of a table of 7 rows; the zero bytes past the key count nothing. The
+// bias folds in the 48 subtracted from every character and the 17 more from
+// the last one.
+struct chunk_weights {
+    alignas(16) std::int16_t row[7][16];  // row[m][i] = 64 >> ((m - i) mod 7)
+    std::uint16_t bias[word_max + 1];     // 48 times the weights of n characters, plus 17 x 64
+};
+
+constexpr chunk_weights make_chunk_weights() {
+    chunk_weights t{};
+    for (int m = 0; m < 7; ++m)
+        for (int i = 0; i < 16; ++i) t.row[m][i] = static_cast<std::int16_t>(64 >> (((m - i) % 7 + 7) % 7));
+    int sum = 0;
+    for (int n = 1; n <= word_max; ++n) {
+        sum += 64 >> ((n - 1) % 7);
+        t.bias[n] = static_cast<std::uint16_t>(48 * sum + 17 * 64);
+    }
+    return t;
+}
+constexpr chunk_weights weights = make_chunk_weights();
+
+inline __m128i weigh_chunk(const char *chunk, const std::int16_t *row) {
+    const __m128i zero = _mm_setzero_si128();
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(chunk));
+    const __m128i *w = reinterpret_cast<const __m128i *>(row);
+    return _mm_add_epi32(_mm_madd_epi16(_mm_unpacklo_epi8(x, zero), w[0]),
+                         _mm_madd_epi16(_mm_unpackhi_epi8(x, zero), w[1]));
+}
+
+inline std::uint16_t hash_padded(const char *key, std::size_t n) {
+    // Most words fit one chunk; its row comes from a small table, not a division.
+    static constexpr std::uint8_t first_row[17] = {0, 0, 1, 2, 3, 4, 5, 6, 0, 1, 2, 3, 4, 5, 6, 0, 1};
+    __m128i sum;
+    if (n <= 16) {
+        sum = weigh_chunk(key, weights.row[first_row[n]]);
+    } else {
+        sum = _mm_setzero_si128();
+        for (std::size_t start = 0; start < n; start += 16)
+            sum = _mm_add_epi32(sum, weigh_chunk(key + start, weights.row[(n - 1 - start) % 7]));
+    }
+    const __m128i pairs = _mm_add_epi32(sum, _mm_shuffle_epi32(sum, 0x4E));
+    const __m128i total = _mm_add_epi32(pairs, _mm_shuffle_epi32(pairs, 0xB1));
+    return static_cast<std::uint16_t>(_mm_cvtsi128_si32(total) - weights.bias[n]);
+}
+#endif
+
 inline std::uint64_t word_at(const char *p) {
     std::uint64_t w;
     std::memcpy(&w, p, sizeof w);
@@ -49,10 +103,15 @@ inline bool same_padded(const char *a, const char *b, std::size_t n) {
 
 // The probe: the slot holding the key, or the first empty slot of its chain
 // (found false), or no_slot when every slot is taken by other names. A
-// padded key is followed by zero bytes up to a whole word.
+// padded key is ASCII followed by zero bytes up to 16 past its end.
 template <bool padded>
 std::uint16_t probe(const char *key, std::size_t n, bool &found) {
-    const std::uint16_t start = static_cast<std::uint16_t>(hash_key(key, n) % dict_slot_count);
+#if defined(__SSE2__)
+    const std::uint16_t h = padded && n >= 1 ? hash_padded(key, n) : hash_key(key, n);
+#else
+    const std::uint16_t h = hash_key(key, n);
+#endif
+    const std::uint16_t start = static_cast<std::uint16_t>(h % dict_slot_count);
     std::uint16_t s = start;
     do {
         const dict_entry *e = dict_slots[s];
@@ -133,53 +192,8 @@ status_code dict_lookup(char *name) {
     return lookup_key<false>(name, key_length(name));
 }
 
-namespace {
-
-// The scanner looks the same few hundred words up again and again. A small
-// direct-mapped memo remembers where each short word's probe ended, so a
-// repeated word skips the hash and the probe. An entry is valid only for the
-// generation in which it was made: a new entry in the table (which can fill
-// the free slot a remembered miss points to) or emptying the table starts a
-// new generation. Changing an entry's kind, code or definition does not: the
-// memo holds slots, and the entry itself is read on every hit.
-struct lookup_memo {
-    std::uint64_t w0, w1;  // the padded name's first 16 bytes
-    std::uint32_t generation;
-    std::uint16_t slot;
-    std::uint8_t length;
-    std::uint8_t found;
-};
-constexpr int memo_bits = 9;
-constexpr std::size_t memo_max = 16;  // longer names always probe
-lookup_memo memo[1u << memo_bits];
-std::uint32_t memo_generation = 1;
-
-inline void new_generation() {
-    if (++memo_generation == 0) {  // wrapped: forget everything
-        for (lookup_memo &m : memo) m.generation = 0;
-        memo_generation = 1;
-    }
-}
-
-}  // namespace
-
 status_code dict_lookup_token(std::size_t length) {
-    const char *key = current_token.text;
-    if (length > memo_max || dict_slots == nullptr) return lookup_key<true>(key, length);
-    const std::uint64_t w0 = word_at(key);
-    const std::uint64_t w1 = length >= 8 ? word_at(key + 8) : 0;
-    const std::uint64_t mix = (w0 * 0x9E3779B97F4A7C15ull) ^ (w1 * 0xC2B2AE3D27D4EB4Full) ^ length;
-    lookup_memo &m = memo[mix >> (64 - memo_bits)];
-    if (m.generation == memo_generation && m.length == length && m.w0 == w0 && m.w1 == w1) {
-        current_token.has_definition = 0;
-        if (m.found) show_entry(*dict_slots[m.slot], true);
-        current_token.slot = m.slot;
-        return m.found;
-    }
-    const status_code r = lookup_key<true>(key, length);
-    if (r == 0 || r == 1) m = {w0, w1, memo_generation, current_token.slot,
-                               static_cast<std::uint8_t>(length), static_cast<std::uint8_t>(r)};
-    return r;
+    return lookup_key<true>(current_token.text, length);
 }
 
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) {
@@ -193,7 +207,6 @@ status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) 
         if (e == nullptr) return TPLEX_MALLOC_FAILED;
         e->definition = nullptr;
         slot = e;
-        new_generation();
     } else if (e->length != n || std::memcmp(e->name, name, n) != 0) {
         // A stale slot (left by a lookup that found the table full, or set
         // by the caller) holds another name: never overwrite it.
@@ -236,12 +249,20 @@ status_code dict_extend(const char *text1, const char *text2, const char *text3,
     dict_entry *e = slot_entry();
     if (e == nullptr) return TPLEX_DISASTER;  // nothing looked up there to extend
     // The new texts may be copies of the old ones (the token's def_text
-    // fields), so the old definition goes only after the copy.
-    auto *d = static_cast<hash_definition *>(mem_alloc(sizeof(hash_definition)));
+    // fields), so the old definition goes only after the copy. Longer texts
+    // are cut to 2499 characters.
+    const std::size_t n1 = text1 != nullptr ? text_length(text1, text_size - 1) : 0;
+    const std::size_t n2 = text2 != nullptr ? text_length(text2, text_size - 1) : 0;
+    const std::size_t n3 = text3 != nullptr ? text_length(text3, text_size - 1) : 0;
+    auto *d = static_cast<hash_definition *>(mem_alloc(sizeof(hash_definition) + n1 + n2 + n3 + 3));
     if (d != nullptr) {
-        copy_text(d->text1, text_size, text1);  // longer texts are cut to 2499
-        copy_text(d->text2, text_size, text2);
-        copy_text(d->text3, text_size, text3);
+        char *texts = reinterpret_cast<char *>(d + 1);
+        d->text1 = texts;
+        texts += copy_text(texts, n1 + 1, text1) + 1;
+        d->text2 = texts;
+        texts += copy_text(texts, n2 + 1, text2) + 1;
+        d->text3 = texts;
+        copy_text(texts, n3 + 1, text3);
         d->flag1 = flag1;
         d->flag2 = flag2;
         d->flag3 = flag3;
@@ -260,7 +281,6 @@ status_code dict_create() {
 }
 
 void dict_clear() {
-    new_generation();
     if (dict_slots == nullptr) return;
     for (int s = 0; s < dict_slot_count; ++s) {
         release_entry(dict_slots[s]);

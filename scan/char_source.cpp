@@ -1,5 +1,7 @@
 #include "scan/char_source.h"
 
+#include <cstring>
+
 #include "lex/text.h"
 #include "source/platform.h"
 #include "source/source_stack.h"
@@ -16,7 +18,7 @@ constexpr std::uint32_t no_line = 0xFFFFFFFFu;
 // The buffer read_cursor points into, so its position can be stored back.
 enum class cursor_owner : std::uint8_t { none, macro, file };
 
-const unsigned char end_of_buffer[1] = {0};
+const unsigned char end_of_buffer[16] = {0};  // a buffer with nothing left
 
 struct cursor_state {
     cursor_owner owner = cursor_owner::none;
@@ -137,6 +139,7 @@ status_code push_macro(const char *body) {
     ++macro_depth;
     m.read_pos = 0;
     m.length = static_cast<std::uint32_t>(copy_text(m.body, text_size, body));
+    std::memset(m.body + m.length, 0, 16);  // scanned 16 bytes at a time
     return 0;
 }
 

@@ -29,7 +29,7 @@ inline constexpr std::uint8_t ch_end_of_input = 255;
 struct macro_frame {
     std::uint32_t read_pos;  // next character of body
     std::uint32_t length;    // characters in body before its NUL
-    char body[text_size];
+    char body[text_size + 16];  // the NUL is followed by 15 more zero bytes
 };
 
 extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1

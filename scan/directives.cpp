@@ -187,7 +187,7 @@ status_code filter() {
         // A switched-off region drops its tokens, so its names are not
         // expanded: bodies that name bodies several times over would keep
         // this one call busy for ever (four names 20 deep are 4^20 bodies).
-        const status_code r = scan_token(live());
+        const status_code r = scan_token_past_line_ends(live());
         if (r == tk_hash_word) {
             const status_code d = process_hash_directive();
             if (d < 0) return d;

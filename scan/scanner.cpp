@@ -3,6 +3,10 @@
 #include <array>
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
@@ -10,6 +14,13 @@
 namespace tplex {
 
 namespace {
+
+// The word path runs for every identifier: keep it in the scan loop.
+#if defined(__GNUC__)
+#define TPLEX_HOT_INLINE inline __attribute__((always_inline))
+#else
+#define TPLEX_HOT_INLINE inline
+#endif
 
 // Character classes. Codes from 128 up are in none of the first four.
 enum : std::uint8_t {
@@ -62,22 +73,49 @@ token_record &tok = current_token;
 
 // Appends the identifier characters that follow in the current buffer to
 // text (upper case), keeping at most word_max characters in all, and pads
-// the text with zero bytes for the dictionary's word-wise compare. Reading
-// straight from the buffer is what peek_char + next_char would do: an
-// identifier character is never a comment bracket, and a word ends where
-// its buffer (a line piece or a body) ends.
-std::size_t take_ident_chars(std::size_t n) {
+// the text with 16 zero bytes for the dictionary's compare and hash.
+// Reading straight from the buffer is what peek_char + next_char would do:
+// an identifier character is never a comment bracket, and a word ends where
+// its buffer (a line piece or a body) ends. Every buffer the cursor reads
+// has 16 readable bytes from its NUL on, so 16 bytes can be looked at once.
+TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
     char *t = tok.text;
+#if defined(__SSE2__)
+    // Signed compares: bytes from 0x80 up are negative, below every bound.
+    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
+    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
+    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
+    for (;;) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const __m128i folded = _mm_or_si128(x, case_bit);
+        const __m128i letter = _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1),
+                                             _mm_cmplt_epi8(folded, z_plus_1));
+        const __m128i digit = _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1),
+                                            _mm_cmplt_epi8(x, nine_plus_1));
+        const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
+        const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
+        if (n < word_max) {  // letters lose their case bit
+            const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n), up);
+        }
+        const unsigned k = stop != 0 ? static_cast<unsigned>(__builtin_ctz(stop)) : 16u;
+        n += k;
+        p += k;
+        if (stop != 0) break;
+    }
+    if (n > word_max) n = word_max;  // the rest was read and dropped
+#else
     for (char u; n < word_max && (u = ident_upper[*p]) != 0; ++p) t[n++] = u;
     while (is_ident(*p)) ++p;  // read and dropped
+#endif
     read_cursor = p;
-    std::memset(t + n, 0, 8);
+    std::memset(t + n, 0, 16);
     return n;
 }
 
 // A word: looked up, and expanded in place when it names a body.
-status_code scan_word(std::uint8_t c, bool expand) {
+TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c, bool expand) {
     tok.text[0] = upper[c];
     const std::size_t n = take_ident_chars(1);
     if (dict_lookup_token(n) != 1) tok.kind = tk_new_identifier;
@@ -257,15 +295,45 @@ void skip_comment(const std::array<bool, 256> &stops) {
 void skip_block_comment() { skip_comment<ch_comment_close, ch_comment_close>(block_stops); }
 void skip_line_comment() { skip_comment<'\n', '\n'>(line_stops); }
 
+inline bool is_blank(std::uint8_t c) { return c == ' ' || c == '\t'; }
+
+// Skips blanks straight from the buffer: one or two one at a time, a longer
+// run (indentation) 16 at a time.
+inline void skip_blanks() {
+    const unsigned char *p = read_cursor;
+    if (!is_blank(*p)) return;
+    if (!is_blank(*++p)) {
+        read_cursor = p;
+        return;
+    }
+#if defined(__SSE2__)
+    const __m128i space = _mm_set1_epi8(' '), tab = _mm_set1_epi8('\t');
+    for (;;) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const unsigned blank = static_cast<unsigned>(
+            _mm_movemask_epi8(_mm_or_si128(_mm_cmpeq_epi8(x, space), _mm_cmpeq_epi8(x, tab))));
+        if (blank != 0xFFFFu) {
+            read_cursor = p + __builtin_ctz(~blank);
+            return;
+        }
+        p += 16;
+    }
+#else
+    while (is_blank(*p)) ++p;
+    read_cursor = p;
+#endif
+}
+
+// One scan. The filter drops every end of line, so it asks for them to be
+// skipped here rather than returned one by one.
+template <bool skip_line_ends>
 inline status_code scan(bool expand) {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
     }
     for (;;) {
-        const unsigned char *p = read_cursor;
-        while (*p == ' ' || *p == '\t') ++p;  // blanks, straight from the buffer
-        read_cursor = p;
+        skip_blanks();
         const std::uint8_t c = next_char();
         status_code result;
         if (is_letter(c)) {
@@ -279,6 +347,7 @@ inline status_code scan(bool expand) {
                     continue;
                 case ch_end_of_body:
                 case '\n':
+                    if (skip_line_ends) continue;
                     return tk_end_of_line;
                 case ch_comment_open:
                     skip_block_comment();
@@ -345,6 +414,8 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token(bool expand) { return scan(expand); }
+status_code scan_token(bool expand) { return scan<false>(expand); }
+
+status_code scan_token_past_line_ends(bool expand) { return scan<true>(expand); }
 
 }  // namespace tplex
