@@ -233,7 +233,7 @@ void run_table_output(const std::uint8_t *data, std::size_t size) {
     output_model m;
     const std::uint8_t f = s.byte();
     // Diagnostics only now and then: they are lines on standard error.
-    m.flags = (f & 0x17u) | ((f & 0xE0u) == 0xE0u ? TPLEX_OUT_DIAGNOSTICS : 0u);
+    m.flags = (f & 0x17u) | (f >= 0xF8u ? TPLEX_OUT_DIAGNOSTICS : 0u);
     m.tag = (f & 0x20u) != 0 ? s.u32() : 0;
     const std::uint8_t ending = s.byte();
     open_output(m);
