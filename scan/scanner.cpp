@@ -52,6 +52,7 @@ constexpr std::array<char, 256> make_upper() {
 }
 constexpr std::array<char, 256> upper = make_upper();
 
+#if !defined(__SSE2__)
 // An identifier character's upper-case form, 0 for any other byte.
 constexpr std::array<char, 256> make_ident_upper() {
     std::array<char, 256> t{};
@@ -60,6 +61,7 @@ constexpr std::array<char, 256> make_ident_upper() {
     return t;
 }
 constexpr std::array<char, 256> ident_upper = make_ident_upper();
+#endif
 
 inline bool is_letter(std::uint8_t c) { return (classes[c] & cc_letter) != 0; }
 inline bool is_digit(std::uint8_t c) { return (classes[c] & cc_digit) != 0; }
