@@ -6,6 +6,7 @@
 #include <emmintrin.h>
 #endif
 
+#include "lex/hot.h"
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
@@ -131,7 +132,7 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
 }
 
 // A found entry describes itself in current_token.
-void show_entry(const dict_entry &e, bool text_is_name) {
+TPLEX_HOT_INLINE void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
     if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);

@@ -8,19 +8,15 @@
 #endif
 
 #include "dict/dictionary.h"
+#include "lex/hot.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
+#include "scan/directives.h"
 
 namespace tplex {
 
 namespace {
 
-// The word path runs for every identifier: keep it in the scan loop.
-#if defined(__GNUC__)
-#define TPLEX_HOT_INLINE inline __attribute__((always_inline))
-#else
-#define TPLEX_HOT_INLINE inline
-#endif
 
 // Character classes. Codes from 128 up are in none of the first four.
 enum : std::uint8_t {
@@ -327,7 +323,7 @@ inline void skip_blanks() {
 // One scan. The filter drops every end of line, so it asks for them to be
 // skipped here rather than returned one by one.
 template <bool skip_line_ends>
-inline status_code scan() {
+TPLEX_HOT_INLINE status_code scan() {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
@@ -416,6 +412,26 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
 
 status_code scan_token() { return scan<false>(); }
 
-status_code scan_token_past_line_ends() { return scan<true>(); }
+// The filter between the scanner and the parser, here so the scan inlines
+// into it: hash words are executed, ends of line dropped (the scan passes
+// over them itself), the end of input delivered whatever the region, and
+// every other result delivered in a live region and dropped in a dead one.
+status_code next_token_filtered() {
+    status_code r;
+    for (;;) {
+        r = scan<true>();
+        if (r == tk_hash_word) {
+            const status_code d = process_hash_directive();
+            if (d < 0) {
+                r = d;
+                break;
+            }
+            continue;
+        }
+        if (r == tk_end_of_input || (r != tk_end_of_line && region_live())) break;
+    }
+    char_source_store();  // the frame's read_pos is true whenever the parser looks
+    return r;
+}
 
 }  // namespace tplex

@@ -13,10 +13,6 @@ namespace tplex {
 // push_back_flag: returns the current kind again without reading.
 status_code scan_token();
 
-// scan_token, but an end of line or of a macro body is passed over instead
-// of returned (a word of a kind that reads as one still comes back).
-status_code scan_token_past_line_ends();
-
 // Adds c as the next digit of *number in base: 0, or TPLEX_BAD_DIGIT when c
 // is no digit of the base. Wraps at 32 bits.
 status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base);
