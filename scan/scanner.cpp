@@ -1,5 +1,6 @@
 #include "scan/scanner.h"
 
+#include <algorithm>
 #include <array>
 #include <cstring>
 
@@ -173,15 +174,48 @@ status_code scan_number(std::uint8_t c, bool negative) {
     return tk_number;
 }
 
-// Bytes that end a plain run inside a string: the quote, the comment
-// bracket characters (the character source folds them), the ends of a
-// buffer and of input.
-constexpr std::array<bool, 256> make_string_stops() {
-    std::array<bool, 256> t{};
-    t[0] = t['"'] = t['/'] = t['*'] = t[ch_end_of_input] = true;
-    return t;
+// A set of bytes that ends a run of characters the scanner can take
+// straight from the buffer. The NUL that ends every buffer is always in it,
+// so a run never passes its buffer's end.
+struct stop_set {
+    std::array<bool, 256> table;
+    std::array<unsigned char, 5> bytes;  // the same set, for the 16-byte search
+};
+
+constexpr stop_set make_stops(unsigned char a, unsigned char b, unsigned char c, unsigned char d) {
+    stop_set s{};
+    s.bytes = {0, a, b, c, d};
+    for (unsigned char x : s.bytes) s.table[x] = true;
+    return s;
 }
-constexpr std::array<bool, 256> string_stops = make_string_stops();
+
+// The first byte at or after p that is in the set. Every buffer the cursor
+// reads has 16 readable bytes from its NUL on.
+inline const unsigned char *run_end(const unsigned char *p, const stop_set &s) {
+#if defined(__SSE2__)
+    const __m128i b0 = _mm_set1_epi8(static_cast<char>(s.bytes[0]));
+    const __m128i b1 = _mm_set1_epi8(static_cast<char>(s.bytes[1]));
+    const __m128i b2 = _mm_set1_epi8(static_cast<char>(s.bytes[2]));
+    const __m128i b3 = _mm_set1_epi8(static_cast<char>(s.bytes[3]));
+    const __m128i b4 = _mm_set1_epi8(static_cast<char>(s.bytes[4]));
+    for (;; p += 16) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const __m128i hit = _mm_or_si128(
+            _mm_or_si128(_mm_cmpeq_epi8(x, b0), _mm_cmpeq_epi8(x, b1)),
+            _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(x, b2), _mm_cmpeq_epi8(x, b3)),
+                         _mm_cmpeq_epi8(x, b4)));
+        const unsigned m = static_cast<unsigned>(_mm_movemask_epi8(hit));
+        if (m != 0) return p + __builtin_ctz(m);
+    }
+#else
+    while (!s.table[*p]) ++p;
+    return p;
+#endif
+}
+
+// Inside a string: the quote, and the comment bracket characters (the
+// character source folds them into markers).
+constexpr stop_set string_stops = make_stops('"', '/', '*', ch_end_of_input);
 
 // A string or PDF string, the opening quote (and "<") already taken. Line
 // feeds and comment marker codes are ordinary characters here.
@@ -192,11 +226,11 @@ status_code scan_string(bool pdf) {
     while (!complete && result == keep_scanning) {
         // A run of plain characters, straight from the buffer.
         const unsigned char *p = read_cursor;
-        while (!string_stops[*p]) {
-            if (n < string_max) tok.text[n++] = static_cast<char>(*p);
-            ++p;
-        }
-        read_cursor = p;
+        const unsigned char *end = run_end(p, string_stops);
+        const std::size_t take = std::min(static_cast<std::size_t>(end - p), string_max - n);
+        std::memcpy(tok.text + n, p, take);
+        n += take;
+        read_cursor = end;
 
         std::uint8_t c = next_char();
         if (c == '"') {
@@ -256,40 +290,26 @@ inline status_code op_pair(std::uint8_t second, int32_t pair, int32_t single) {
     return op(pair);
 }
 
-// Bytes a comment cannot simply pass over: the ends of a buffer and of
-// input, the closing bytes, and the bracket characters, which the
-// character source may fold into a marker.
-constexpr std::array<bool, 256> make_block_stops() {
-    std::array<bool, 256> t{};
-    t[0] = t['/'] = t['*'] = t[ch_comment_close] = t[ch_end_of_input] = true;
-    return t;
-}
-constexpr std::array<bool, 256> block_stops = make_block_stops();
-
+// A comment cannot simply pass over the closing bytes, nor the bracket
+// characters, which the character source may fold into a marker.
+constexpr stop_set block_stops = make_stops('/', '*', ch_comment_close, ch_end_of_input);
 // A fold never consumes a line feed, so a line comment needs no brackets.
-constexpr std::array<bool, 256> make_line_stops() {
-    std::array<bool, 256> t{};
-    t[0] = t['\n'] = t[ch_end_of_input] = true;
-    return t;
-}
-constexpr std::array<bool, 256> line_stops = make_line_stops();
+constexpr stop_set line_stops = make_stops('\n', ch_end_of_input, ch_end_of_input, ch_end_of_input);
 
 // Takes characters up to and including the first of the ends.
-template <std::uint8_t end1, std::uint8_t end2>
-void skip_comment(const std::array<bool, 256> &stops) {
+template <std::uint8_t end>
+void skip_comment(const stop_set &stops) {
     for (;;) {
-        const unsigned char *p = read_cursor;
-        while (!stops[*p]) ++p;
-        read_cursor = p;
+        read_cursor = run_end(read_cursor, stops);
         const std::uint8_t c = next_char();
-        if (c == end1 || c == end2 || c == ch_end_of_body || c == ch_end_of_input) return;
+        if (c == end || c == ch_end_of_body || c == ch_end_of_input) return;
     }
 }
 
 // A block comment ends at "*/" (or the end of a body or of input); a line
 // comment takes its line feed, so no end of line follows it.
-void skip_block_comment() { skip_comment<ch_comment_close, ch_comment_close>(block_stops); }
-void skip_line_comment() { skip_comment<'\n', '\n'>(line_stops); }
+void skip_block_comment() { skip_comment<ch_comment_close>(block_stops); }
+void skip_line_comment() { skip_comment<'\n'>(line_stops); }
 
 inline bool is_blank(std::uint8_t c) { return c == ' ' || c == '\t'; }
 
