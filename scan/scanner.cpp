@@ -290,6 +290,72 @@ inline status_code op_pair(std::uint8_t second, int32_t pair, int32_t single) {
     return op(pair);
 }
 
+// What a character starts, for the scan's one dispatch. Every byte that
+// starts no token (control characters, "$", "?", "@", backslash, "_", the
+// grave accent, 127 and up, "*/" outside a comment, 254) is cl_bad.
+enum : std::uint8_t {
+    cl_bad,
+    cl_letter,
+    cl_digit,
+    cl_blank,
+    cl_end_of_line,   // a line feed, or the end of a body
+    cl_comment,       // "/*"
+    cl_line_comment,  // "//"
+    cl_end_of_input,
+    cl_quote,
+    cl_apostrophe,
+    cl_hash,
+    cl_minus,
+    cl_less,
+    cl_greater,
+    cl_pair,          // an operator alone, or paired with one second character
+    cl_single,        // an operator of one character only
+};
+
+struct pair_op {
+    std::uint8_t second;  // the character that makes the pair
+    std::int32_t value;   // the pair's operator value
+};
+
+constexpr std::array<pair_op, 256> make_pairs() {
+    std::array<pair_op, 256> t{};
+    t['!'] = {'=', op_not_equal};
+    t['&'] = {'&', op_and_and};
+    t['.'] = {'.', op_dot_dot};
+    t['/'] = {'=', op_slash_equal};
+    t['^'] = {'^', op_xor_xor};
+    t['|'] = {'|', op_or_or};
+    return t;
+}
+constexpr std::array<pair_op, 256> pairs = make_pairs();
+
+constexpr std::array<std::uint8_t, 256> make_dispatch() {
+    std::array<std::uint8_t, 256> t{};
+    for (int c = 0; c < 256; ++c) {
+        if (classes[c] & cc_letter) t[c] = cl_letter;
+        if (classes[c] & cc_digit) t[c] = cl_digit;
+        if (pairs[c].second != 0) t[c] = cl_pair;
+    }
+    t[' '] = t['\t'] = cl_blank;
+    t[ch_end_of_body] = t['\n'] = cl_end_of_line;
+    t[ch_comment_open] = cl_comment;
+    t[ch_line_comment] = cl_line_comment;
+    t[ch_end_of_input] = cl_end_of_input;
+    t['"'] = cl_quote;
+    t['\''] = cl_apostrophe;
+    t['#'] = cl_hash;
+    t['-'] = cl_minus;
+    t['<'] = cl_less;
+    t['>'] = cl_greater;
+    for (unsigned char c : {'%', '(', ')', '*', '+', ',', ':', ';', '=', '[', ']', '{', '}', '~'})
+        t[c] = cl_single;
+    return t;
+}
+constexpr std::array<std::uint8_t, 256> dispatch = make_dispatch();
+static_assert(dispatch['_'] == cl_bad && dispatch['$'] == cl_bad && dispatch['\r'] == cl_bad);
+static_assert(dispatch[ch_comment_close] == cl_bad && dispatch[254] == cl_bad && dispatch[128] == cl_bad);
+static_assert(dispatch['/'] == cl_pair && dispatch['*'] == cl_single && dispatch['z'] == cl_letter);
+
 // A comment cannot simply pass over the closing bytes, nor the bracket
 // characters, which the character source may fold into a marker.
 constexpr stop_set block_stops = make_stops('/', '*', ch_comment_close, ch_end_of_input);
@@ -352,63 +418,54 @@ TPLEX_HOT_INLINE status_code scan() {
         skip_blanks();
         const std::uint8_t c = next_char();
         status_code result;
-        if (is_letter(c)) {
-            result = scan_word(c);
-        } else if (is_digit(c)) {
-            result = scan_number(c, false);
-        } else {
-            switch (c) {
-                case ' ':
-                case '\t':
-                    continue;
-                case ch_end_of_body:
-                case '\n':
-                    if (skip_line_ends) continue;
-                    return tk_end_of_line;
-                case ch_comment_open:
-                    skip_block_comment();
-                    continue;
-                case ch_line_comment:
-                    skip_line_comment();
-                    continue;
-                case ch_end_of_input:
-                    tok.kind = tk_end_of_input;
-                    return tk_end_of_input;
-                case '"':
-                    return scan_string(false);
-                case '\'':
-                    return scan_char_literal();
-                case '#':
-                    return scan_hash_word();
-                case '-':
-                    if (is_digit(peek_char())) return scan_number(next_char(), true);
-                    return op('-');
-                case '<':
-                    if (peek_char() == '=') return op_pair('=', op_less_equal, '<');
-                    if (peek_char() == '<') return op_pair('<', op_shift_left, '<');
-                    if (peek_char() == '"') {
-                        next_char();
-                        return scan_string(true);
-                    }
-                    return op('<');
-                case '>':
-                    if (peek_char() == '=') return op_pair('=', op_greater_equal, '>');
-                    return op_pair('>', op_shift_right, '>');
-                case '!': return op_pair('=', op_not_equal, '!');
-                case '&': return op_pair('&', op_and_and, '&');
-                case '.': return op_pair('.', op_dot_dot, '.');
-                case '/': return op_pair('=', op_slash_equal, '/');
-                case '^': return op_pair('^', op_xor_xor, '^');
-                case '|': return op_pair('|', op_or_or, '|');
-                case '%': case '(': case ')': case '*': case '+': case ',':
-                case ':': case ';': case '=': case '[': case ']': case '{':
-                case '}': case '~':
-                    return op(c);
-                default:
-                    return TPLEX_BAD_CHARACTER;
-            }
+        switch (dispatch[c]) {
+            case cl_letter:
+                result = scan_word(c);
+                if (result != keep_scanning) return result;
+                continue;  // a name's body is being read, or a word of kind 0
+            case cl_digit:
+                return scan_number(c, false);
+            case cl_blank:
+                continue;
+            case cl_end_of_line:
+                if (skip_line_ends) continue;
+                return tk_end_of_line;
+            case cl_comment:
+                skip_block_comment();
+                continue;
+            case cl_line_comment:
+                skip_line_comment();
+                continue;
+            case cl_end_of_input:
+                tok.kind = tk_end_of_input;
+                return tk_end_of_input;
+            case cl_quote:
+                return scan_string(false);
+            case cl_apostrophe:
+                return scan_char_literal();
+            case cl_hash:
+                return scan_hash_word();
+            case cl_minus:
+                if (is_digit(peek_char())) return scan_number(next_char(), true);
+                return op('-');
+            case cl_less:
+                if (peek_char() == '=') return op_pair('=', op_less_equal, '<');
+                if (peek_char() == '<') return op_pair('<', op_shift_left, '<');
+                if (peek_char() == '"') {
+                    next_char();
+                    return scan_string(true);
+                }
+                return op('<');
+            case cl_greater:
+                if (peek_char() == '=') return op_pair('=', op_greater_equal, '>');
+                return op_pair('>', op_shift_right, '>');
+            case cl_pair:
+                return op_pair(pairs[c].second, pairs[c].value, c);
+            case cl_single:
+                return op(c);
+            default:
+                return TPLEX_BAD_CHARACTER;
         }
-        if (result != keep_scanning) return result;
     }
 }
 
