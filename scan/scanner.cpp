@@ -310,6 +310,8 @@ enum : std::uint8_t {
     cl_greater,
     cl_pair,          // an operator alone, or paired with one second character
     cl_single,        // an operator of one character only
+    cl_slash,         // "/", which may also open a comment
+    cl_star,          // "*", which may also close one
 };
 
 struct pair_op {
@@ -322,7 +324,6 @@ constexpr std::array<pair_op, 256> make_pairs() {
     t['!'] = {'=', op_not_equal};
     t['&'] = {'&', op_and_and};
     t['.'] = {'.', op_dot_dot};
-    t['/'] = {'=', op_slash_equal};
     t['^'] = {'^', op_xor_xor};
     t['|'] = {'|', op_or_or};
     return t;
@@ -347,14 +348,16 @@ constexpr std::array<std::uint8_t, 256> make_dispatch() {
     t['-'] = cl_minus;
     t['<'] = cl_less;
     t['>'] = cl_greater;
-    for (unsigned char c : {'%', '(', ')', '*', '+', ',', ':', ';', '=', '[', ']', '{', '}', '~'})
+    t['/'] = cl_slash;
+    t['*'] = cl_star;
+    for (unsigned char c : {'%', '(', ')', '+', ',', ':', ';', '=', '[', ']', '{', '}', '~'})
         t[c] = cl_single;
     return t;
 }
 constexpr std::array<std::uint8_t, 256> dispatch = make_dispatch();
 static_assert(dispatch['_'] == cl_bad && dispatch['$'] == cl_bad && dispatch['\r'] == cl_bad);
 static_assert(dispatch[ch_comment_close] == cl_bad && dispatch[254] == cl_bad && dispatch[128] == cl_bad);
-static_assert(dispatch['/'] == cl_pair && dispatch['*'] == cl_single && dispatch['z'] == cl_letter);
+static_assert(dispatch['/'] == cl_slash && dispatch['*'] == cl_star && dispatch['z'] == cl_letter);
 
 // A comment cannot simply pass over the closing bytes, nor the bracket
 // characters, which the character source may fold into a marker.
@@ -416,7 +419,9 @@ TPLEX_HOT_INLINE status_code scan() {
     }
     for (;;) {
         skip_blanks();
-        const std::uint8_t c = next_char();
+        // read_char, not next_char: the comment brackets are folded below,
+        // in the two cases that can start one.
+        const std::uint8_t c = read_char();
         status_code result;
         switch (dispatch[c]) {
             case cl_letter:
@@ -459,6 +464,24 @@ TPLEX_HOT_INLINE status_code scan() {
             case cl_greater:
                 if (peek_char() == '=') return op_pair('=', op_greater_equal, '>');
                 return op_pair('>', op_shift_right, '>');
+            case cl_slash:
+                if (peek_char() == '*') {
+                    read_char();
+                    skip_block_comment();
+                    continue;
+                }
+                if (peek_char() == '/') {
+                    read_char();
+                    skip_line_comment();
+                    continue;
+                }
+                return op_pair('=', op_slash_equal, '/');
+            case cl_star:
+                if (peek_char() == '/') {
+                    read_char();
+                    return TPLEX_BAD_CHARACTER;  // a "*/" outside a comment
+                }
+                return op('*');
             case cl_pair:
                 return op_pair(pairs[c].second, pairs[c].value, c);
             case cl_single:
