@@ -1,7 +1,9 @@
 // The platform layer on a POSIX host: Windows text-mode reading emulated
 // over large blocks.
 //
-// Each stream opened here has a slot with a 64 KiB block of raw bytes. A
+// Each stream opened here has a slot with a 32 KiB block of raw bytes (a
+// nested include costs that much memory, and no more is needed to read at
+// full speed). A
 // line is copied out of the block in runs (memchr finds the line feed,
 // memcpy moves the run); carriage returns and the 0x1A end mark are found
 // with memchr as well, once per block and once after each carriage return,
@@ -18,7 +20,7 @@ namespace tplex::platform {
 
 namespace {
 
-constexpr std::size_t read_block_size = 64 * 1024;
+constexpr std::size_t read_block_size = 32 * 1024;
 // 19 files can be open on the source stack at once; the rest is headroom
 // for callers that open streams of their own through this layer.
 constexpr int stream_slot_count = 24;

@@ -1,5 +1,5 @@
 // Text-mode reading on the host: CR LF, 0x1A, the line limit, and the
-// boundaries of the 64 KiB blocks that the reader works in.
+// boundaries of the 32 KiB blocks that the reader works in.
 #include "source/platform.h"
 
 #include <gtest/gtest.h>
@@ -16,7 +16,7 @@ namespace tplex {
 namespace {
 
 using Lines = std::vector<std::string>;
-constexpr std::size_t block = 64 * 1024;
+constexpr std::size_t block = 32 * 1024;
 
 // Reads every line of a stream; a line's length is found from a filler byte
 // written behind it, so NUL bytes inside a line count as well.
