@@ -268,7 +268,8 @@ status_code dict_extend(const char *text1, const char *text2, const char *text3,
 
 status_code dict_create() {
     if (dict_slots != nullptr) return 0;
-    dict_slots = static_cast<dict_entry **>(mem_alloc(sizeof(dict_entry *) * dict_slot_count));
+    // An array of entry addresses.  NOLINTNEXTLINE(bugprone-sizeof-expression)
+    dict_slots = static_cast<dict_entry **>(mem_alloc(sizeof dict_slots[0] * dict_slot_count));
     if (dict_slots == nullptr) return TPLEX_MALLOC_FAILED;
     for (int s = 0; s < dict_slot_count; ++s) dict_slots[s] = nullptr;
     return 0;

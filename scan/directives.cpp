@@ -109,7 +109,7 @@ status_code read_body(char *body, status_code &last_scan) {
 status_code do_define() {
     scan_token();
     // The name and the body get one block: text_size for each.
-    char *name = static_cast<char *>(mem_alloc(2 * text_size));
+    char *name = static_cast<char *>(mem_alloc(2 * std::size_t{text_size}));
     if (name == nullptr) return TPLEX_MALLOC_FAILED;
     char *body = name + text_size;
     copy_text(name, text_size, tok.text);

@@ -20,7 +20,7 @@ namespace tplex::platform {
 
 namespace {
 
-constexpr std::size_t read_block_size = 32 * 1024;
+constexpr std::size_t read_block_size = std::size_t{32} * 1024;
 // 19 files can be open on the source stack at once; the rest is headroom
 // for callers that open streams of their own through this layer.
 constexpr int stream_slot_count = 24;
