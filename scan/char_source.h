@@ -85,6 +85,8 @@ status_code push_macro(const char *body);
 // source: store the read position into its frame and derive it again from
 // the stacks on the next read.
 void char_source_sync();
+// Stores the read position into its frame; the cursor stays where it is.
+void char_source_store();
 // The stacks' storage is going away: drop the cursor without storing.
 void char_source_forget();
 

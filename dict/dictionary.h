@@ -1,0 +1,74 @@
+// The symbol dictionary: 1664 slots, linear probing with wrap-around, no
+// deletion, no growth. Names are stored in upper case. The operations that
+// change the table act on the slot that the last lookup left in
+// current_token.slot.
+#ifndef TPLEX_DICT_DICTIONARY_H
+#define TPLEX_DICT_DICTIONARY_H
+
+#include <cstddef>
+#include <cstdint>
+
+#include "lex/limits.h"
+#include "tplex/lexer.h"
+
+namespace tplex {
+
+// The optional payload of an entry; for a name of kind 4, text1 is its body.
+struct hash_definition {
+    char text1[text_size];
+    char text2[text_size];
+    char text3[text_size];
+    std::uint8_t flag1, flag2, flag3;
+};
+
+struct dict_entry {
+    std::uint8_t kind;
+    char name[word_max + 1];  // upper case, at most 128 characters
+    std::int16_t code;
+    hash_definition *definition;  // null, or owned by the entry
+    std::uint8_t length;          // characters in name
+};
+
+extern dict_entry **dict_slots;  // dict_slot_count slots; null before lex_initialise
+extern std::uint16_t hash_weights[word_max];
+
+// Fills hash_weights: 64, 32, 16, 8, 4, 2, 1, repeated.
+void fill_hash_weights();
+
+// The home slot of an upper-case name. Only its first 128 characters count:
+// a longer name is stored, hashed and compared as those 128.
+std::uint16_t dict_hash(const char *name);
+// Upper-cases a-z in place.
+void dict_upcase(char *name);
+
+// Upper-cases name in place and searches for it. 1 found (current_token
+// takes the entry's kind, code, name and definition), 0 not found, or
+// TPLEX_DISASTER when the table is full. Either way has_definition is
+// cleared first, and slot is left at the entry or at the free slot where
+// an insert of this name goes (unchanged when the table is full).
+status_code dict_lookup(char *name);
+// The scanner's lookup of current_token.text, which it has already
+// upper-cased and whose length it knows. Same results as dict_lookup.
+status_code dict_lookup_token(std::size_t length);
+
+// Stores a name at current_token.slot: in a new entry when the slot is
+// empty, over the entry there when it holds the same name. 0,
+// TPLEX_MALLOC_FAILED, TPLEX_DISASTER (the slot holds another name, which
+// is never overwritten) or TPLEX_NOT_INITIALISED.
+status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name);
+// Changes kind and code of the entry at current_token.slot.
+void dict_set_kind(std::uint8_t kind, std::int16_t code);
+// Attaches a new definition to the entry at current_token.slot. 0,
+// TPLEX_MALLOC_FAILED, TPLEX_DISASTER (no entry there) or
+// TPLEX_NOT_INITIALISED.
+status_code dict_extend(const char *text1, const char *text2, const char *text3,
+                        std::uint8_t flag1, std::uint8_t flag2, std::uint8_t flag3);
+
+// Lifecycle, run by lex_initialise, the reset and lex_free.
+status_code dict_create();
+void dict_clear();
+void dict_destroy();
+
+}  // namespace tplex
+
+#endif

@@ -1,0 +1,136 @@
+#include "scan/char_source.h"
+
+#include "lex/text.h"
+#include "source/platform.h"
+#include "source/source_stack.h"
+
+namespace tplex {
+
+macro_frame *macro_stack = nullptr;
+std::uint16_t macro_depth = 0;
+
+namespace {
+
+constexpr std::uint32_t no_line = 0xFFFFFFFFu;
+
+// The buffer read_cursor points into, so its position can be stored back.
+enum class cursor_owner : std::uint8_t { none, macro, file };
+
+const unsigned char end_of_buffer[1] = {0};
+
+struct cursor_state {
+    cursor_owner owner = cursor_owner::none;
+    int index = 0;  // macro frame index, or source depth
+    const unsigned char *base = end_of_buffer;
+} cur;
+
+void store_position() {
+    switch (cur.owner) {
+        case cursor_owner::macro:
+            macro_stack[cur.index].read_pos = static_cast<std::uint32_t>(read_cursor - cur.base);
+            break;
+        case cursor_owner::file:
+            source_stack[cur.index].read_pos = static_cast<std::uint16_t>(read_cursor - cur.base);
+            break;
+        case cursor_owner::none:
+            break;
+    }
+}
+
+void drop_cursor() {
+    cur.owner = cursor_owner::none;
+    read_cursor = end_of_buffer;
+}
+
+void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t pos) {
+    cur.owner = owner;
+    cur.index = index;
+    cur.base = reinterpret_cast<const unsigned char *>(base);
+    read_cursor = cur.base + pos;
+}
+
+// The frame being read, or null when no file is open (or the depth has been
+// set out of range through the parser's address).
+source_frame *current_frame() {
+    if (source_stack == nullptr || source_depth < 1 || source_depth > max_source_depth)
+        return nullptr;
+    return &source_stack[source_depth];
+}
+
+// The character of a frame's line at its read position; NUL past the line.
+inline std::uint8_t line_char(const source_frame &f) {
+    return f.read_pos < line_size ? static_cast<std::uint8_t>(f.line_text[f.read_pos]) : 0;
+}
+
+}  // namespace
+
+const unsigned char *read_cursor = end_of_buffer;
+
+void char_source_sync() {
+    store_position();
+    drop_cursor();
+}
+
+void char_source_forget() { drop_cursor(); }
+
+std::uint8_t read_char_slow() {
+    char_source_sync();
+
+    // Macro text first; a frame goes only once its NUL has been handed out.
+    while (macro_depth > 0 && macro_stack[macro_depth - 1].read_pos > macro_stack[macro_depth - 1].length)
+        --macro_depth;
+    if (macro_depth > 0) {
+        macro_frame &m = macro_stack[macro_depth - 1];
+        const auto c = static_cast<std::uint8_t>(m.body[m.read_pos++]);
+        if (c != 0) point_cursor(cursor_owner::macro, macro_depth - 1, m.body, m.read_pos);
+        return c;
+    }
+
+    source_frame *f = current_frame();
+    if (f == nullptr) return ch_end_of_input;
+    if (f->line_no == no_line || line_char(*f) == 0) {
+        // A file that has no more lines is closed and the includer goes on
+        // with its next line.
+        while (!platform::read_line(f->file, f->line_text, line_size)) {
+            if (f->file != nullptr) platform::close_source(f->file);
+            f->file = nullptr;
+            --source_depth;
+            f = current_frame();
+            if (f == nullptr) return ch_end_of_input;
+        }
+        ++f->line_no;
+        f->read_pos = 0;
+    }
+    const std::uint8_t c = line_char(*f);
+    if (c == 0) return 0;  // a line that starts with a NUL byte
+    ++f->read_pos;
+    point_cursor(cursor_owner::file, source_depth, f->line_text, f->read_pos);
+    return c;
+}
+
+std::uint8_t peek_char_slow() {
+    store_position();
+    if (macro_depth >= 1) {
+        const macro_frame &m = macro_stack[macro_depth - 1];
+        return m.read_pos < m.length ? static_cast<std::uint8_t>(m.body[m.read_pos]) : ' ';
+    }
+    const source_frame *f = current_frame();
+    if (f == nullptr) return ' ';
+    const std::uint8_t c = line_char(*f);
+    return c != 0 ? c : ' ';
+}
+
+status_code push_macro(const char *body) {
+    if (macro_depth >= macro_frame_count) return TPLEX_TOO_MANY_MACRO_LEVELS;
+    if (macro_stack == nullptr) return TPLEX_NOT_INITIALISED;
+    char_source_sync();
+    macro_frame &m = macro_stack[macro_depth];
+    ++macro_depth;
+    m.read_pos = 0;
+    m.length = static_cast<std::uint32_t>(copy_text(m.body, text_size, body));
+    return 0;
+}
+
+void char_source_store() { store_position(); }
+
+}  // namespace tplex

@@ -1,0 +1,29 @@
+// The preprocessing layer between the scanner and the parser: drops ends of
+// line and switched-off regions, and executes the five hash words.
+#ifndef TPLEX_SCAN_DIRECTIVES_H
+#define TPLEX_SCAN_DIRECTIVES_H
+
+#include <cstdint>
+
+#include "lex/limits.h"
+#include "tplex/lexer.h"
+
+namespace tplex {
+
+// Flags of the nested #ifdef/#ifndef regions: 1 delivers, 0 skips. Entry 0
+// is the whole input and is always 1; cond_depth indexes the innermost.
+extern std::uint8_t cond_stack[cond_flag_count];
+extern std::uint16_t cond_depth;
+
+// The next token the parser gets: its kind, or a failure code. The next
+// call goes on after the point where a failure happened.
+status_code next_token_filtered();
+// Runs the hash word in current_token (its code in value). 0 or more to go
+// on, or a failure code.
+status_code process_hash_directive();
+// Predefines names as kind 25, code 2. 0, or TPLEX_ALREADY_DEFINED.
+status_code sc_lex_init_defines(char **names, std::int32_t count);
+
+}  // namespace tplex
+
+#endif
