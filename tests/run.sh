@@ -47,13 +47,13 @@ windows_build_and_test() {
     need_packages g++-mingw-w64-i686 googletest wine wine32:i386
     export WINEPREFIX=${TPLEX_WINEPREFIX:-/tmp/tplex-wine-$(id -u)}
     export WINEARCH=win32 WINEDEBUG=-all WINEDLLOVERRIDES="mscoree,mshtml="
-    if [ ! -f "$WINEPREFIX/system.reg" ]; then
-        echo "== creating the Wine prefix $WINEPREFIX"
-        wineboot --init >/dev/null 2>&1
-    fi
-    # One Wine server for every test program, stopped however this ends.
+    [ -f "$WINEPREFIX/system.reg" ] || echo "== creating the Wine prefix $WINEPREFIX"
+    # One Wine server for every test program, stopped however this ends. Its
+    # services start here, away from ctest: they live as long as the server
+    # and would hold a test's output pipe open, so ctest would never finish.
     wineserver -p </dev/null >/dev/null 2>&1 || true
     trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
+    wineboot </dev/null >/dev/null 2>&1
     build_and_test windows -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64-i686.cmake"
     wineserver -k >/dev/null 2>&1 || true
     trap - EXIT
