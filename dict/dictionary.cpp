@@ -2,6 +2,10 @@
 
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
@@ -34,10 +38,66 @@ std::uint16_t hash_key(const char *name, std::size_t n) {
     return h;
 }
 
+#if defined(__SSE2__)
+// The hash of a key of at most 16 characters (signed bytes are not needed:
+// the scanner's words are ASCII) followed by zero bytes to 16: the weighted
+// sum as one multiply-add over 16 lanes, with weights per length.
+struct padded_weights {
+    alignas(16) std::int16_t w[17][16];  // w[n][i]: the weight of character i of n
+    std::uint16_t bias[17];              // 48 times the weights' sum, plus 17 x 64
+};
+
+constexpr padded_weights make_padded_weights() {
+    padded_weights t{};
+    for (int n = 1; n <= 16; ++n) {
+        int sum = 0;
+        for (int i = 0; i < n; ++i) {
+            const int d = n - 1 - i;
+            t.w[n][i] = static_cast<std::int16_t>(64 >> (d % 7));
+            sum += t.w[n][i];
+        }
+        t.bias[n] = static_cast<std::uint16_t>(48 * sum + 17 * 64);
+    }
+    return t;
+}
+constexpr padded_weights weights16 = make_padded_weights();
+
+inline std::uint16_t hash_padded16(const char *key, std::size_t n) {
+    const __m128i zero = _mm_setzero_si128();
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(key));
+    const __m128i *w = reinterpret_cast<const __m128i *>(weights16.w[n]);
+    const __m128i sum = _mm_add_epi32(_mm_madd_epi16(_mm_unpacklo_epi8(x, zero), w[0]),
+                                      _mm_madd_epi16(_mm_unpackhi_epi8(x, zero), w[1]));
+    const __m128i pairs = _mm_add_epi32(sum, _mm_shuffle_epi32(sum, 0x4E));
+    const __m128i total = _mm_add_epi32(pairs, _mm_shuffle_epi32(pairs, 0xB1));
+    return static_cast<std::uint16_t>(_mm_cvtsi128_si32(total) - weights16.bias[n]);
+}
+#endif
+
+inline std::uint64_t word_at(const char *p) {
+    std::uint64_t w;
+    std::memcpy(&w, p, sizeof w);
+    return w;
+}
+
+// Equal names, both followed by zero bytes up to a whole word.
+inline bool same_padded(const char *a, const char *b, std::size_t n) {
+    for (std::size_t i = 0; i <= n; i += 8)
+        if (word_at(a + i) != word_at(b + i)) return false;
+    return true;
+}
+
 // The probe: the slot holding the key, or the first empty slot of its chain
-// (found false), or no_slot when every slot is taken by other names.
+// (found false), or no_slot when every slot is taken by other names. A
+// padded key is ASCII followed by zero bytes up to 16 past its end.
+template <bool padded>
 std::uint16_t probe(const char *key, std::size_t n, bool &found) {
-    const std::uint16_t start = static_cast<std::uint16_t>(hash_key(key, n) % dict_slot_count);
+#if defined(__SSE2__)
+    const std::uint16_t h = padded && n >= 1 && n <= 16 ? hash_padded16(key, n) : hash_key(key, n);
+#else
+    const std::uint16_t h = hash_key(key, n);
+#endif
+    const std::uint16_t start = static_cast<std::uint16_t>(h % dict_slot_count);
     std::uint16_t s = start;
     do {
         const dict_entry *e = dict_slots[s];
@@ -45,7 +105,8 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
             found = false;
             return s;
         }
-        if (e->length == n && std::memcmp(e->name, key, n) == 0) {
+        if (e->length == n &&
+            (padded ? same_padded(e->name, key, n) : std::memcmp(e->name, key, n) == 0)) {
             found = true;
             return s;
         }
@@ -56,10 +117,10 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
 }
 
 // A found entry describes itself in current_token.
-void show_entry(const dict_entry &e) {
+void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
-    std::memmove(t.text, e.name, e.length + 1u);
+    if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
     t.value = e.code;
     if (e.definition != nullptr) {
         const hash_definition &d = *e.definition;
@@ -73,13 +134,15 @@ void show_entry(const dict_entry &e) {
     }
 }
 
+// A padded key is the token's own text, which already reads as the name.
+template <bool padded>
 status_code lookup_key(const char *key, std::size_t n) {
     current_token.has_definition = 0;
     if (dict_slots == nullptr) return 0;
     bool found = false;
-    const std::uint16_t s = probe(key, n, found);
+    const std::uint16_t s = probe<padded>(key, n, found);
     if (s == no_slot) return TPLEX_DISASTER;
-    if (found) show_entry(*dict_slots[s]);
+    if (found) show_entry(*dict_slots[s], padded);
     current_token.slot = s;
     return found ? 1 : 0;
 }
@@ -112,10 +175,12 @@ void dict_upcase(char *name) {
 
 status_code dict_lookup(char *name) {
     dict_upcase(name);
-    return lookup_key(name, key_length(name));
+    return lookup_key<false>(name, key_length(name));
 }
 
-status_code dict_lookup_token(std::size_t length) { return lookup_key(current_token.text, length); }
+status_code dict_lookup_token(std::size_t length) {
+    return lookup_key<true>(current_token.text, length);
+}
 
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) {
     if (dict_slots == nullptr) return TPLEX_NOT_INITIALISED;
@@ -134,8 +199,8 @@ status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) 
         return TPLEX_DISASTER;
     }
     e->kind = kind;
+    std::memset(e->name, 0, sizeof e->name);
     std::memcpy(e->name, name, n);
-    e->name[n] = '\0';
     e->length = static_cast<std::uint8_t>(n);
     e->code = code;
     // A reused entry loses its definition; nothing else can reach it.
@@ -163,12 +228,20 @@ status_code dict_extend(const char *text1, const char *text2, const char *text3,
     dict_entry *e = slot_entry();
     if (e == nullptr) return TPLEX_DISASTER;  // nothing looked up there to extend
     // The new texts may be copies of the old ones (the token's def_text
-    // fields), so the old definition goes only after the copy.
-    auto *d = static_cast<hash_definition *>(mem_alloc(sizeof(hash_definition)));
+    // fields), so the old definition goes only after the copy. Longer texts
+    // are cut to 2499 characters.
+    const std::size_t n1 = text1 != nullptr ? text_length(text1, text_size - 1) : 0;
+    const std::size_t n2 = text2 != nullptr ? text_length(text2, text_size - 1) : 0;
+    const std::size_t n3 = text3 != nullptr ? text_length(text3, text_size - 1) : 0;
+    auto *d = static_cast<hash_definition *>(mem_alloc(sizeof(hash_definition) + n1 + n2 + n3 + 3));
     if (d != nullptr) {
-        copy_text(d->text1, text_size, text1);  // longer texts are cut to 2499
-        copy_text(d->text2, text_size, text2);
-        copy_text(d->text3, text_size, text3);
+        char *texts = reinterpret_cast<char *>(d + 1);
+        d->text1 = texts;
+        texts += copy_text(texts, n1 + 1, text1) + 1;
+        d->text2 = texts;
+        texts += copy_text(texts, n2 + 1, text2) + 1;
+        d->text3 = texts;
+        copy_text(texts, n3 + 1, text3);
         d->flag1 = flag1;
         d->flag2 = flag2;
         d->flag3 = flag3;

@@ -14,16 +14,23 @@
 namespace tplex {
 
 // The optional payload of an entry; for a name of kind 4, text1 is its body.
+// Each text holds at most 2499 characters; the three are stored back to back
+// right after this header, in one block sized to fit them, so a definition
+// costs its texts' length rather than three full text fields.
 struct hash_definition {
-    char text1[text_size];
-    char text2[text_size];
-    char text3[text_size];
+    const char *text1;
+    const char *text2;
+    const char *text3;
     std::uint8_t flag1, flag2, flag3;
 };
 
+// Room for a name of 128 characters, its NUL and zero padding to a whole
+// number of 8-byte words, so names compare a word at a time.
+inline constexpr std::size_t name_room = (word_max + 1 + 7) / 8 * 8;
+
 struct dict_entry {
     std::uint8_t kind;
-    char name[word_max + 1];  // upper case, at most 128 characters
+    char name[name_room];  // upper case, at most 128 characters, zero-padded
     std::int16_t code;
     hash_definition *definition;  // null, or owned by the entry
     std::uint8_t length;          // characters in name
@@ -48,7 +55,9 @@ void dict_upcase(char *name);
 // an insert of this name goes (unchanged when the table is full).
 status_code dict_lookup(char *name);
 // The scanner's lookup of current_token.text, which it has already
-// upper-cased and whose length it knows. Same results as dict_lookup.
+// upper-cased, whose length (at most 128) it knows, whose characters are
+// ASCII, and which it has followed with 16 zero bytes. Same results as
+// dict_lookup.
 status_code dict_lookup_token(std::size_t length);
 
 // Stores a name at current_token.slot: in a new entry when the slot is

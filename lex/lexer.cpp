@@ -33,8 +33,12 @@ void reset_counters() {
 // Every frame without a file and with an empty path and line. Frame 0 never
 // holds a file, yet a diagnostic at depth 0 prints its position: line
 // number all ones prints as line 0.
+// The scanner looks at 16 bytes at a time from a line's NUL on: the last
+// frame's line is followed by its file handle and this much more.
+constexpr std::size_t source_stack_bytes = sizeof(source_frame) * source_frame_count + 16;
+
 void clear_frames() {
-    std::memset(source_stack, 0, sizeof(source_frame) * source_frame_count);
+    std::memset(source_stack, 0, source_stack_bytes);
     for (int d = 0; d < source_frame_count; ++d) source_stack[d].line_no = 0xFFFFFFFFu;
 }
 
@@ -77,7 +81,7 @@ status_code lex_initialise() {
         dict_destroy();
         return TPLEX_MALLOC_FAILED;
     }
-    source_stack = static_cast<source_frame *>(mem_alloc(sizeof(source_frame) * source_frame_count));
+    source_stack = static_cast<source_frame *>(mem_alloc(source_stack_bytes));
     if (source_stack == nullptr) {
         dict_destroy();
         mem_free(macro_stack);

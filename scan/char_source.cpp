@@ -1,5 +1,7 @@
 #include "scan/char_source.h"
 
+#include <cstring>
+
 #include "lex/text.h"
 #include "source/platform.h"
 #include "source/source_stack.h"
@@ -16,7 +18,7 @@ constexpr std::uint32_t no_line = 0xFFFFFFFFu;
 // The buffer read_cursor points into, so its position can be stored back.
 enum class cursor_owner : std::uint8_t { none, macro, file };
 
-const unsigned char end_of_buffer[1] = {0};
+const unsigned char end_of_buffer[16] = {0};  // a buffer with nothing left
 
 struct cursor_state {
     cursor_owner owner = cursor_owner::none;
@@ -40,6 +42,7 @@ void store_position() {
 void drop_cursor() {
     cur.owner = cursor_owner::none;
     read_cursor = end_of_buffer;
+    cursor_line_pos = nullptr;
 }
 
 void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t pos) {
@@ -47,6 +50,12 @@ void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t
     cur.index = index;
     cur.base = reinterpret_cast<const unsigned char *>(base);
     read_cursor = cur.base + pos;
+    if (owner == cursor_owner::file) {
+        cursor_line = cur.base;
+        cursor_line_pos = &source_stack[index].read_pos;
+    } else {
+        cursor_line_pos = nullptr;
+    }
 }
 
 // The frame being read, or null when no file is open (or the depth has been
@@ -65,6 +74,8 @@ inline std::uint8_t line_char(const source_frame &f) {
 }  // namespace
 
 const unsigned char *read_cursor = end_of_buffer;
+const unsigned char *cursor_line = end_of_buffer;
+std::uint16_t *cursor_line_pos = nullptr;
 
 void char_source_sync() {
     store_position();
@@ -128,9 +139,8 @@ status_code push_macro(const char *body) {
     ++macro_depth;
     m.read_pos = 0;
     m.length = static_cast<std::uint32_t>(copy_text(m.body, text_size, body));
+    std::memset(m.body + m.length, 0, 16);  // scanned 16 bytes at a time
     return 0;
 }
-
-void char_source_store() { store_position(); }
 
 }  // namespace tplex

@@ -29,13 +29,17 @@ inline constexpr std::uint8_t ch_end_of_input = 255;
 struct macro_frame {
     std::uint32_t read_pos;  // next character of body
     std::uint32_t length;    // characters in body before its NUL
-    char body[text_size];
+    char body[text_size + 16];  // the NUL is followed by 15 more zero bytes
 };
 
 extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1
 extern std::uint16_t macro_depth;
 
 extern const unsigned char *read_cursor;
+// While the cursor reads a file's line: that line, and its frame's read_pos
+// (null otherwise), so the position can be stored back cheaply.
+extern const unsigned char *cursor_line;
+extern std::uint16_t *cursor_line_pos;
 
 std::uint8_t read_char_slow();
 std::uint8_t peek_char_slow();
@@ -85,8 +89,12 @@ status_code push_macro(const char *body);
 // source: store the read position into its frame and derive it again from
 // the stacks on the next read.
 void char_source_sync();
-// Stores the read position into its frame; the cursor stays where it is.
-void char_source_store();
+// Stores the read position into its source frame; the cursor stays where
+// it is. (A macro frame's position is internal and stored when needed.)
+inline void char_source_store() {
+    if (cursor_line_pos != nullptr)
+        *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
+}
 // The stacks' storage is going away: drop the cursor without storing.
 void char_source_forget();
 

@@ -7,6 +7,7 @@
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
+#include "scan/char_source.h"
 #include "scan/scanner.h"
 #include "source/source_stack.h"
 
@@ -168,7 +169,9 @@ status_code process_hash_directive() {
     return result;
 }
 
-status_code next_token_filtered() {
+namespace {
+
+status_code filter() {
     for (;;) {
         const status_code r = scan_token();
         if (r == tk_hash_word) {
@@ -180,6 +183,14 @@ status_code next_token_filtered() {
         if (r == tk_end_of_line) continue;
         if (live()) return r;
     }
+}
+
+}  // namespace
+
+status_code next_token_filtered() {
+    const status_code r = filter();
+    char_source_store();  // the frame's read_pos is true whenever the parser looks
+    return r;
 }
 
 status_code sc_lex_init_defines(char **names, std::int32_t count) {

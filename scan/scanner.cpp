@@ -3,6 +3,10 @@
 #include <array>
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
@@ -41,6 +45,15 @@ constexpr std::array<char, 256> make_upper() {
 }
 constexpr std::array<char, 256> upper = make_upper();
 
+// An identifier character's upper-case form, 0 for any other byte.
+constexpr std::array<char, 256> make_ident_upper() {
+    std::array<char, 256> t{};
+    for (int c = 0; c < 256; ++c)
+        if (classes[c] & cc_ident) t[c] = upper[c];
+    return t;
+}
+constexpr std::array<char, 256> ident_upper = make_ident_upper();
+
 inline bool is_letter(std::uint8_t c) { return (classes[c] & cc_letter) != 0; }
 inline bool is_digit(std::uint8_t c) { return (classes[c] & cc_digit) != 0; }
 inline bool is_hex(std::uint8_t c) { return (classes[c] & cc_hex) != 0; }
@@ -52,18 +65,45 @@ constexpr int32_t keep_scanning = 0;
 token_record &tok = current_token;
 
 // Appends the identifier characters that follow in the current buffer to
-// text (upper case), keeping at most word_max characters in all. Reading
-// straight from the buffer is what peek_char + next_char would do: an
-// identifier character is never a comment bracket, and a word ends where
-// its buffer (a line piece or a body) ends.
+// text (upper case), keeping at most word_max characters in all, and pads
+// the text with 16 zero bytes for the dictionary's compare and hash.
+// Reading straight from the buffer is what peek_char + next_char would do:
+// an identifier character is never a comment bracket, and a word ends where
+// its buffer (a line piece or a body) ends. Every buffer the cursor reads
+// has 16 readable bytes from its NUL on, so 16 bytes can be looked at once.
 std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
-    while (is_ident(*p)) {
-        if (n < word_max) tok.text[n++] = upper[*p];
-        ++p;
+    char *t = tok.text;
+#if defined(__SSE2__)
+    // Signed compares: bytes from 0x80 up are negative, below every bound.
+    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
+    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
+    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
+    for (;;) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const __m128i folded = _mm_or_si128(x, case_bit);
+        const __m128i letter = _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1),
+                                             _mm_cmplt_epi8(folded, z_plus_1));
+        const __m128i digit = _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1),
+                                            _mm_cmplt_epi8(x, nine_plus_1));
+        const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
+        const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
+        if (n < word_max) {  // letters lose their case bit
+            const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n), up);
+        }
+        const unsigned k = stop != 0 ? static_cast<unsigned>(__builtin_ctz(stop)) : 16u;
+        n += k;
+        p += k;
+        if (stop != 0) break;
     }
+    if (n > word_max) n = word_max;  // the rest was read and dropped
+#else
+    for (char u; n < word_max && (u = ident_upper[*p]) != 0; ++p) t[n++] = u;
+    while (is_ident(*p)) ++p;  // read and dropped
+#endif
     read_cursor = p;
-    tok.text[n] = '\0';
+    std::memset(t + n, 0, 16);
     return n;
 }
 
@@ -75,6 +115,18 @@ status_code scan_word(std::uint8_t c) {
     if (tok.kind == tk_macro) return push_macro(tok.def_text1);  // 0: scan the body
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
+
+// A digit's value in bases up to 16, or no_digit.
+constexpr std::uint8_t no_digit = 0xFF;
+constexpr std::array<std::uint8_t, 256> make_digit_values() {
+    std::array<std::uint8_t, 256> t{};
+    for (auto &v : t) v = no_digit;
+    for (int c = '0'; c <= '9'; ++c) t[c] = static_cast<std::uint8_t>(c - '0');
+    for (int c = 'A'; c <= 'F'; ++c) t[c] = t[c + 32] = static_cast<std::uint8_t>(c - 55);
+    return t;
+}
+constexpr std::array<std::uint8_t, 256> digit_values = make_digit_values();
+static_assert(digit_values['f'] == 15 && digit_values['g'] == no_digit && digit_values['9'] == 9);
 
 // A number, its first character c already taken.
 status_code scan_number(std::uint8_t c, bool negative) {
@@ -89,14 +141,26 @@ status_code scan_number(std::uint8_t c, bool negative) {
     }
     std::uint32_t number = 0;
     status_code result = add_digit(&number, c, base);
-    std::size_t n = 0;
-    tok.text[n++] = static_cast<char>(c);
-    for (const unsigned char *p = read_cursor; result >= 0 && is_hex(*p); ++p) {
-        result = add_digit(&number, *p, base);
-        if (n < word_max) tok.text[n++] = static_cast<char>(*p);
-        read_cursor = p + 1;
+    char *t = tok.text;
+    t[0] = static_cast<char>(c);
+    std::size_t n = 1;
+    // Hex digits follow straight from the buffer (they are never comment
+    // brackets); one that is no digit of the base is taken, kept in the
+    // text, and ends the number with a failure.
+    const unsigned char *p = read_cursor;
+    if (result >= 0) {
+        for (std::uint8_t d; (d = digit_values[*p]) != no_digit; ++p) {
+            if (n < word_max) t[n++] = static_cast<char>(*p);
+            if (d >= base) {
+                result = TPLEX_BAD_DIGIT;
+                ++p;
+                break;
+            }
+            number = number * base + d;
+        }
     }
-    tok.text[n] = '\0';
+    read_cursor = p;
+    t[n] = '\0';
     if (result < 0) {
         tok.value = static_cast<int32_t>(number);
         return result;
@@ -106,6 +170,16 @@ status_code scan_number(std::uint8_t c, bool negative) {
     return tk_number;
 }
 
+// Bytes that end a plain run inside a string: the quote, the comment
+// bracket characters (the character source folds them), the ends of a
+// buffer and of input.
+constexpr std::array<bool, 256> make_string_stops() {
+    std::array<bool, 256> t{};
+    t[0] = t['"'] = t['/'] = t['*'] = t[ch_end_of_input] = true;
+    return t;
+}
+constexpr std::array<bool, 256> string_stops = make_string_stops();
+
 // A string or PDF string, the opening quote (and "<") already taken. Line
 // feeds and comment marker codes are ordinary characters here.
 status_code scan_string(bool pdf) {
@@ -113,6 +187,14 @@ status_code scan_string(bool pdf) {
     status_code result = keep_scanning;
     bool complete = false;
     while (!complete && result == keep_scanning) {
+        // A run of plain characters, straight from the buffer.
+        const unsigned char *p = read_cursor;
+        while (!string_stops[*p]) {
+            if (n < string_max) tok.text[n++] = static_cast<char>(*p);
+            ++p;
+        }
+        read_cursor = p;
+
         std::uint8_t c = next_char();
         if (c == '"') {
             if (peek_char() == '"') {
@@ -171,26 +253,50 @@ inline status_code op_pair(std::uint8_t second, int32_t pair, int32_t single) {
     return op(pair);
 }
 
-void skip_block_comment() {
-    std::uint8_t c;
-    do c = next_char();
-    while (c != ch_comment_close && c != ch_end_of_body && c != ch_end_of_input);
+// Bytes a comment cannot simply pass over: the ends of a buffer and of
+// input, the closing bytes, and the bracket characters, which the
+// character source may fold into a marker.
+constexpr std::array<bool, 256> make_block_stops() {
+    std::array<bool, 256> t{};
+    t[0] = t['/'] = t['*'] = t[ch_comment_close] = t[ch_end_of_input] = true;
+    return t;
+}
+constexpr std::array<bool, 256> block_stops = make_block_stops();
+
+// A fold never consumes a line feed, so a line comment needs no brackets.
+constexpr std::array<bool, 256> make_line_stops() {
+    std::array<bool, 256> t{};
+    t[0] = t['\n'] = t[ch_end_of_input] = true;
+    return t;
+}
+constexpr std::array<bool, 256> line_stops = make_line_stops();
+
+// Takes characters up to and including the first of the ends.
+template <std::uint8_t end1, std::uint8_t end2>
+void skip_comment(const std::array<bool, 256> &stops) {
+    for (;;) {
+        const unsigned char *p = read_cursor;
+        while (!stops[*p]) ++p;
+        read_cursor = p;
+        const std::uint8_t c = next_char();
+        if (c == end1 || c == end2 || c == ch_end_of_body || c == ch_end_of_input) return;
+    }
 }
 
-// Takes everything up to and including the line feed, so no end of line
-// follows a line comment.
-void skip_line_comment() {
-    std::uint8_t c;
-    do c = next_char();
-    while (c != '\n' && c != ch_end_of_body && c != ch_end_of_input);
-}
+// A block comment ends at "*/" (or the end of a body or of input); a line
+// comment takes its line feed, so no end of line follows it.
+void skip_block_comment() { skip_comment<ch_comment_close, ch_comment_close>(block_stops); }
+void skip_line_comment() { skip_comment<'\n', '\n'>(line_stops); }
 
-status_code scan() {
+inline status_code scan() {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
     }
     for (;;) {
+        const unsigned char *p = read_cursor;
+        while (*p == ' ' || *p == '\t') ++p;  // blanks, straight from the buffer
+        read_cursor = p;
         const std::uint8_t c = next_char();
         status_code result;
         if (is_letter(c)) {
@@ -270,10 +376,6 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token() {
-    const status_code result = scan();
-    char_source_store();  // keep the frame's read_pos true for the parser
-    return result;
-}
+status_code scan_token() { return scan(); }
 
 }  // namespace tplex

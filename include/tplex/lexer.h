@@ -140,6 +140,7 @@ typedef int32_t status_code;
 #define TPLEX_OUT_NOT_OPEN             TPLEX_STATUS(0xD3470019u) /* AbandonOutput with no output open */
 #define TPLEX_OUT_TOO_MANY_BLOCKS      TPLEX_STATUS(0xD347001Au) /* BeginBlock with 100 blocks open */
 #define TPLEX_OUT_NO_OPEN_BLOCK        TPLEX_STATUS(0xD347001Bu) /* EndBlock with no block open */
+#define TPLEX_OUT_STRING_TOO_LONG      TPLEX_STATUS(0xD347001Cu) /* a string of 10000 characters or more; nothing stored */
 
 /* ------------------------------------------------------------------------ */
 /* Token kinds                                                              */

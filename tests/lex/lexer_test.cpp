@@ -177,7 +177,7 @@ TEST(LexerLifecycle, ExportsAreSafeBeforeInitialisation) {
     EXPECT_EQ(::sc_lex_init_defines(names, 1), TPLEX_NOT_INITIALISED);
     EXPECT_EQ(::sg_closesources(), 0);
     EXPECT_EQ(::open_source_file("x"), TPLEX_NOT_INITIALISED);
-    EXPECT_EQ(::open_source_file(nullptr), TPLEX_NULL_FILENAME);
+    EXPECT_EQ(::open_source_file(nullptr), TPLEX_NOT_INITIALISED);
 }
 
 #ifdef TPLEX_ALLOC_HOOK

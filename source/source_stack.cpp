@@ -1,0 +1,147 @@
+// The source stack: the main file at frame 1 and each included file above
+// the file that includes it; the include directory list searched for
+// relative names.
+#include "source/source_stack.h"
+
+#include <cstddef>
+#include <cstring>
+
+#include "lex/lexer.h"
+#include "scan/char_source.h"
+#include "source/platform.h"
+
+namespace tplex {
+
+source_frame *source_stack = nullptr;
+int16_t source_depth = 0;
+char include_dirs[include_dir_entries][include_dir_size];
+int32_t include_dir_count = 0;
+
+namespace {
+
+inline constexpr std::uint32_t no_line_yet = 0xFFFFFFFFu;
+
+// Length of text when it has at most limit characters, else limit + 1;
+// reads no further than that.
+std::size_t bounded_length(const char *text, std::size_t limit) {
+    std::size_t len = 0;
+    while (len <= limit && text[len] != '\0') ++len;
+    return len;
+}
+
+// Puts an opened file on the stack as the new top frame.
+status_code push_frame(std::FILE *file, const char *path, std::size_t path_len) {
+    source_frame &frame = source_stack[source_depth + 1];
+    frame.read_pos = 0;
+    frame.line_no = no_line_yet;
+    std::memcpy(frame.path, path, path_len);
+    frame.path[path_len] = '\0';
+    // No line has been read yet: a diagnostic shows an empty line rather
+    // than what an earlier file left in this frame.
+    frame.line_text[0] = '\0';
+    frame.file = file;
+    return ++source_depth;
+}
+
+// Opens name as given. A name too long for a frame's path is not opened:
+// failure_code, as if the file did not exist.
+status_code open_as_given(const char *name, status_code failure_code) {
+    const std::size_t len = bounded_length(name, path_size - 1);
+    if (len > static_cast<std::size_t>(path_size - 1)) return failure_code;
+    std::FILE *file = platform::open_source(name);
+    if (file == nullptr) return failure_code;
+    return push_frame(file, name, len);
+}
+
+// Tries each include directory in order: directory, one backslash, name.
+// A directory whose joined text would not fit a frame's path is passed over
+// as one that does not hold the file; nothing is opened under a cut name.
+status_code open_from_include_dirs(const char *name) {
+    char joined[join_buffer_size];
+    const std::size_t path_max = path_size - 1;
+    const std::size_t name_len = bounded_length(name, path_max);
+    for (int32_t i = 0; i < include_dir_count; ++i) {
+        const char *dir = include_dirs[i];
+        const std::size_t dir_len = bounded_length(dir, include_dir_size - 1);
+        if (dir_len + 1 + name_len > path_max) continue;
+        std::memcpy(joined, dir, dir_len);
+        joined[dir_len] = '\\';
+        std::memcpy(joined + dir_len + 1, name, name_len);
+        joined[dir_len + 1 + name_len] = '\0';
+        if (std::FILE *file = platform::open_source(joined))
+            return push_frame(file, joined, dir_len + 1 + name_len);
+    }
+    return TPLEX_CANNOT_OPEN_SOURCE;
+}
+
+}  // namespace
+
+// On a POSIX host a name that begins with "/" is absolute as well.
+bool is_absolute_path(const char *name) {
+    if (name == nullptr) return false;
+    const unsigned char first = static_cast<unsigned char>(name[0]);
+    const bool letter = (first >= 'A' && first <= 'Z') || (first >= 'a' && first <= 'z');
+    if (letter && name[1] == ':' && name[2] == '\\' && name[3] != '\0' && name[4] != '\0')
+        return true;
+    if (first == '\\') return true;
+#ifndef _WIN32
+    if (first == '/') return true;
+#endif
+    return false;
+}
+
+// A failed open changes no frame at all: the frame above the top already
+// holds no file, and its position is only set once a file is on it.
+status_code open_source_file(const char *name) {
+    if (source_stack == nullptr) return TPLEX_NOT_INITIALISED;
+    if (name == nullptr) return TPLEX_NULL_FILENAME;
+    char_source_sync();
+    // A negative depth (only a caller writing through the handed-out
+    // address can make one) is refused like a full stack rather than
+    // followed outside the block.
+    if (source_depth < 0 || source_depth >= max_source_depth) return TPLEX_TOO_MANY_INCLUDE_LEVELS;
+
+    if (is_absolute_path(name)) return open_as_given(name, TPLEX_CANNOT_OPEN_SOURCE);
+    if (include_dir_count > 0) return open_from_include_dirs(name);
+    return open_as_given(name, TPLEX_NO_INCLUDE_DIRS);
+}
+
+// Before the stack exists there is nothing open to close: 0.
+status_code close_sources() {
+    if (source_stack == nullptr) return TPLEX_OK;
+    char_source_sync();
+    status_code result = TPLEX_OK;
+    for (int i = max_source_depth; i >= 1; --i) {
+        source_frame &frame = source_stack[i];
+        if (frame.file == nullptr) continue;
+        if (platform::close_source(frame.file) != 0) result = TPLEX_CLOSE_FAILED;
+        frame.file = nullptr;
+    }
+    return result;
+}
+
+// The main file is reopened under the path it was opened with, which, with
+// the include directories gone, reaches the same file.
+status_code rewind_input() {
+    if (source_stack == nullptr) return TPLEX_NOT_INITIALISED;
+    lex_reset();
+    char main_path[path_size];
+    std::memcpy(main_path, source_stack[1].path, sizeof main_path);
+    main_path[path_size - 1] = '\0';
+    close_sources();
+    return open_source_file(main_path);
+}
+
+// A null directory, or one too long for an entry (254 characters), is
+// refused with TPLEX_BAD_DIRECTORY_NAME and the list is unchanged.
+status_code add_include_dir(const char *dir) {
+    if (include_dir_count + 1 >= include_dir_entries) return TPLEX_TOO_MANY_INCLUDE_DIRS;
+    if (dir == nullptr) return TPLEX_BAD_DIRECTORY_NAME;
+    const std::size_t len = bounded_length(dir, include_dir_size - 1);
+    if (len > static_cast<std::size_t>(include_dir_size - 1)) return TPLEX_BAD_DIRECTORY_NAME;
+    std::memcpy(include_dirs[include_dir_count], dir, len + 1);
+    ++include_dir_count;
+    return TPLEX_OK;
+}
+
+}  // namespace tplex

@@ -1,0 +1,192 @@
+// Every failure code with its message and its effect on the table file.
+#include <sys/stat.h>
+
+#include <functional>
+#include <string>
+
+#include "table_fixture.h"
+
+namespace tplex::test {
+namespace {
+
+using Action = std::function<status_code()>;
+
+class FailureTest : public TableTest {
+protected:
+    // Runs `run` on an open output, diagnostics on and off, and checks the
+    // code, the message on standard error and whether the file was closed:
+    // a closed file takes no further byte, and AbandonOutput still deletes it.
+    void expect_failure(const Action &run, status_code code, const std::string &message,
+                        bool closes) {
+        for (std::uint32_t flags : {TPLEX_OUT_DIAGNOSTICS, 0u}) {
+            open(flags);
+            CaptureStderr err;
+            EXPECT_EQ(run(), code);
+            EXPECT_EQ(err.text(), flags != 0 ? message : "");
+            EXPECT_EQ(PutByte(0) == TPLEX_OUT_WRITE_FAILED, closes);
+            EXPECT_EQ(AbandonOutput(1), TPLEX_OK);
+            EXPECT_FALSE(exists());
+        }
+    }
+};
+
+// Set-up steps before the failing one cannot fail.
+status_code allocate_50001() {
+    std::uint32_t id = 0;
+    for (int i = 0; i < 50000; ++i) AllocateReference(&id);
+    status_code s = AllocateReference(&id);
+    return id == 0 ? s : TPLEX_OK;
+}
+status_code define_twice() {
+    std::uint32_t id;
+    DefineReferenceHere(&id, 0, 0);
+    return DefineReference(id, 40);
+}
+status_code use_beyond_r() {
+    std::uint32_t id;
+    DefineReferenceHere(&id, 0, 0), CreateReference(id, 9999);
+    return CloseOutput();
+}
+status_code string_beyond_r() {  // S + position - 1 must not wrap below R
+    std::uint32_t id;
+    AllocateReference(&id), CreateReference(id, 16), WriteUInt32(0);
+    SetReferenceTarget(id, 0xFFFFFFF0u, 1);
+    return CloseOutput();
+}
+
+TEST_F(FailureTest, ReferencesAndClose) {
+    const std::string out_of_range = "sg_TableOutput: Relocatable out of range\n";
+    expect_failure(allocate_50001, TPLEX_OUT_TOO_MANY_REFERENCES,
+                   "sg_TableOutput (StoreString): Failed to allocate reference\n", true);
+    expect_failure([] { return DefineReference(3, 20); }, TPLEX_OUT_BAD_TARGET_ID,
+                   "sg_TableOutput: Illegal cross reference id 3\n", true);
+    expect_failure(define_twice, TPLEX_OUT_DOUBLE_DEFINITION,
+                   "sg_TableOutput: Double definition of reference 0\n", true);
+    expect_failure([] { return CreateReference(0, 20); }, TPLEX_OUT_BAD_USE_ID,
+                   "sg_TableOutput: Illegal cross reference id 0\n", true);
+    expect_failure([] { return StoreString("s"), table_output.store.total += 3, CloseOutput(); },
+                   TPLEX_OUT_STRING_TABLE_DAMAGED,
+                   "sg_TableOutput: String table integrity damaged\n", true);
+    expect_failure([] { return DefineReferenceHere(nullptr, 0, 0), CloseOutput(); },
+                   TPLEX_OUT_UNUSED_REFERENCE, "sg_TableOutput: Relocatable with no references 0\n",
+                   true);
+    expect_failure([] { return WriteReference(nullptr, 0), DefineReference(1, 0), CloseOutput(); },
+                   TPLEX_OUT_UNDEFINED_REFERENCE,
+                   "sg_TableOutput: Relocatable with no definition\n", true);
+    expect_failure(use_beyond_r, TPLEX_OUT_OUT_OF_RANGE, out_of_range, true);
+    expect_failure(string_beyond_r, TPLEX_OUT_OUT_OF_RANGE, out_of_range, true);
+    expect_failure(EndBlock, TPLEX_OUT_NO_OPEN_BLOCK, "", false);
+}
+
+TEST_F(FailureTest, RefusalsChangeNothing) {
+    std::string longest(9999, 'x'), too_long(10000, 'x');
+    auto store_long = [&] {
+        std::uint32_t before = output_stream.offset, position = 7;
+        status_code s = StoreString(too_long.c_str());
+        EXPECT_EQ(AddToStringStore(&position, too_long.c_str()), s);
+        EXPECT_EQ(position + output_stream.offset, before);
+        EXPECT_EQ(StoreString(longest.c_str()), TPLEX_OK);
+        return s;
+    };
+    const char *too_long_message = "sg_TableOutput (StoreString): String too long\n";
+    expect_failure(store_long, TPLEX_OUT_STRING_TOO_LONG,
+                   std::string(too_long_message) + too_long_message, false);
+    // A second output while the first still has its file open.
+    auto reopen = [&] {
+        return OpenOutput((path + "2").c_str(),
+                          output_stream.diagnostics ? TPLEX_OUT_DIAGNOSTICS : 0, 0);
+    };
+    expect_failure(reopen, TPLEX_OUT_CANNOT_OPEN, "sg_TableOutput: can't open '" + path + "2'\n",
+                   false);
+    EXPECT_EQ(AbandonOutput(0), TPLEX_OUT_NOT_OPEN);
+    EXPECT_EQ(CloseOutput(), TPLEX_OUT_NOT_OPEN);
+}
+
+TEST_F(FailureTest, OpenFailures) {
+    for (const std::string &name : {dir.path() + "/missing/t", std::string(200, 'n')}) {
+        CaptureStderr err;
+        EXPECT_EQ(OpenOutput(name.c_str(), TPLEX_OUT_DIAGNOSTICS, 0), TPLEX_OUT_CANNOT_OPEN);
+        EXPECT_EQ(err.text(), "sg_TableOutput: can't open '" + name + "'\n");
+        EXPECT_EQ(AbandonOutput(0), TPLEX_OUT_NOT_OPEN);
+    }
+    EXPECT_EQ(OpenOutput(nullptr, 0, 0), TPLEX_OUT_CANNOT_OPEN);
+    path = dir.path() + "/" + std::string(199 - dir.path().size() - 1, 'n');  // 199 characters
+    open();
+    EXPECT_EQ(AbandonOutput(0), TPLEX_OK);
+    EXPECT_FALSE(exists());
+}
+
+// A failing write closes the file once; later bytes fail quietly; the failed
+// output can be abandoned; a full disk is never reported as success.
+TEST_F(FailureTest, WriteFailuresOnAFullDevice) {
+    if (access("/dev/full", W_OK) != 0) GTEST_SKIP() << "no /dev/full";
+    for (std::uint32_t flags : {0u, TPLEX_OUT_HEX_TEXT}) {
+        ASSERT_EQ(symlink("/dev/full", path.c_str()), 0);
+        open(TPLEX_OUT_DIAGNOSTICS | flags);
+        CaptureStderr err;
+        status_code s = TPLEX_OK;
+        for (int i = 0; i < (1 << 20) && s == TPLEX_OK; ++i) s = WriteUInt8(1);
+        EXPECT_EQ(s, TPLEX_OUT_WRITE_FAILED);
+        EXPECT_EQ(WriteUInt32(1), TPLEX_OUT_WRITE_FAILED);
+        EXPECT_EQ(CloseOutput(), TPLEX_OUT_WRITE_FAILED);
+        EXPECT_EQ(err.text(), "sg_TableOutput: Fatal erorr: Write byte error\n");
+        EXPECT_EQ(AbandonOutput(0), TPLEX_OK);
+    }
+    ASSERT_EQ(symlink("/dev/full", path.c_str()), 0);
+    open();  // a small table: only the final flush can fail
+    EXPECT_EQ(CloseOutput(), TPLEX_OUT_WRITE_FAILED);
+}
+
+TEST_F(FailureTest, SeekFailureIsAlwaysPrintedOnStandardOutput) {
+    ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
+    open();  // no diagnostics
+    CaptureStdout out;
+    EXPECT_EQ(CloseOutput(), TPLEX_OUT_SEEK_FAILED);
+    EXPECT_EQ(out.text(), "sg_TableOutput: File seek failed - error = -1\n");
+    EXPECT_EQ(PutByte(0), TPLEX_OUT_WRITE_FAILED);
+}
+
+#ifdef TPLEX_ALLOC_HOOK
+// Allocation n of `run` fails.
+Action failing(unsigned long n, const Action &run) {
+    return [n, run] {
+        mem_fail_at(n);
+        status_code s = run();
+        mem_fail_at(0);
+        return s;
+    };
+}
+
+TEST_F(FailureTest, AllocationFailures) {
+    expect_failure(failing(1, [] { return WriteReference(nullptr, 0); }), TPLEX_OUT_NO_MEMORY_RELOC,
+                   "sg_TableOutput (CreateReference): Failed to malloc reloc record\n", true);
+    auto second_chunk = [] {  // 9 bytes left; allocation 1 is the use's record
+        AddToStringStore(nullptr, std::string(9990, 'x').c_str());
+        return failing(2, [] { return StoreString("0123456789"); })();
+    };
+    expect_failure(second_chunk, TPLEX_OUT_NO_MEMORY_CHUNK,
+                   "sg_TableOutput (StoreString): Failed to malloc StringStore\n", true);
+    // OpenOutput: the store's chunk, then the table; the empty file stays.
+    const char *messages[] = {"sg_TableOutput: Failed to malloc StringStore\n",
+                              "sg_TableOutput: Failed to malloc relocatables\n"};
+    for (unsigned long n : {1ul, 2ul}) {
+        CaptureStderr err;
+        EXPECT_EQ(failing(n, [&] { return OpenOutput(path.c_str(), TPLEX_OUT_DIAGNOSTICS, 0); })(),
+                  TPLEX_OUT_NO_MEMORY_TABLES);
+        EXPECT_EQ(err.text(), messages[n - 1]);
+        EXPECT_TRUE(exists() && file().empty());
+        EXPECT_EQ(AbandonOutput(0), TPLEX_OUT_NOT_OPEN);
+        FreeOutputTables();
+    }
+    // Memory output: a full chunk whose successor cannot be had loses the byte.
+    ASSERT_EQ(StartMemoryOutput(), TPLEX_OK);
+    for (int i = 0; i < 10000; ++i) PutByte(1);
+    EXPECT_EQ(failing(1, [] { return PutByte(2); })(), TPLEX_OUT_NO_MEMORY_CHUNK);
+    EXPECT_EQ(output_stream.offset, 10000u);
+    EXPECT_EQ(failing(1, StartMemoryOutput)(), TPLEX_OUT_NO_MEMORY_CHUNK);
+    EXPECT_EQ(MemoryOutputSize(), 10000u);  // the earlier image is kept
+}
+#endif
+
+}  // namespace
+}  // namespace tplex::test

@@ -1,0 +1,100 @@
+// Helpers of the table output tests: a fixture that owns a temporary table
+// file and resets the module, a standard error capture, and byte helpers.
+#ifndef TPLEX_TESTS_TABLE_FIXTURE_H
+#define TPLEX_TESTS_TABLE_FIXTURE_H
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <fstream>
+#include <iterator>
+#include <list>
+#include <string>
+#include <vector>
+
+#include "lex/memory.h"
+#include "table_output/table_check.h"
+#include "table_output/references.h"
+#include "test_support.h"
+#include "tplex/table_output.h"
+
+namespace tplex::test {
+
+using Bytes = std::vector<std::uint8_t>;
+
+// Captures file descriptor 2 (and so stderr) until text().
+class CaptureStderr {
+public:
+    CaptureStderr() : file_(std::tmpfile()), saved_(dup(2)) { dup2(fileno(file_), 2); }
+    ~CaptureStderr() { text(); }
+    std::string text() {
+        if (file_ == nullptr) return captured_;
+        dup2(saved_, 2);
+        close(saved_);
+        std::rewind(file_);
+        for (int c; (c = std::fgetc(file_)) != EOF;) captured_ += static_cast<char>(c);
+        std::fclose(file_);
+        file_ = nullptr;
+        return captured_;
+    }
+
+private:
+    std::FILE *file_;
+    int saved_;
+    std::string captured_;
+};
+
+// "3c 01 ff": bytes from..to as lower-case hex, for readable comparisons.
+inline std::string hex(const std::uint8_t *b, std::size_t from, std::size_t to) {
+    std::string s;
+    char item[4];
+    for (std::size_t i = from; i < to; ++i) {
+        std::snprintf(item, sizeof item, s.empty() ? "%02x" : " %02x", b[i]);
+        s += item;
+    }
+    return s;
+}
+
+class TableTest : public ::testing::Test {
+protected:
+    TempDir dir;
+    std::string path = dir.path() + "/out.tbl";
+
+    void TearDown() override {
+#ifdef TPLEX_ALLOC_HOOK
+        mem_fail_at(0);
+#endif
+        AbandonOutput(1);
+        FreeOutputTables();
+        FreeMemoryOutput();
+        for (TableCheck &c : checks_) release_table_check(c);
+    }
+    void open(std::uint32_t flags = 0, std::uint32_t tag = 0) {
+        ASSERT_EQ(OpenOutput(path.c_str(), flags, tag), TPLEX_OK);
+    }
+    Bytes file() const {
+        std::ifstream in(path, std::ios::binary);
+        return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+    }
+    bool exists() const {
+        return access(path.c_str(), F_OK) == 0;
+    }
+    // Closes and returns the checked table (decoded from hex text if need be),
+    // valid until the test ends.
+    const TableCheck &closed() {
+        EXPECT_EQ(CloseOutput(), TPLEX_OK);
+        const Bytes &b = files_.emplace_back(file());
+        TableCheck &c = checks_.emplace_back();
+        EXPECT_TRUE(check_table(b.data(), b.size(), c)) << c.error;
+        return c;
+    }
+
+private:
+    std::list<Bytes> files_;
+    std::list<TableCheck> checks_;
+};
+
+}  // namespace tplex::test
+
+#endif

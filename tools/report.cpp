@@ -1,0 +1,171 @@
+#include "tools/report.h"
+
+#include <cstdio>
+#include <cstring>
+
+#ifdef _WIN32
+#include <io.h>
+#define tool_dup _dup
+#define tool_dup2 _dup2
+#define tool_close _close
+#define tool_fileno _fileno
+#else
+#include <unistd.h>
+#define tool_dup dup
+#define tool_dup2 dup2
+#define tool_close close
+#define tool_fileno fileno
+#endif
+
+namespace tplex::tool {
+
+namespace {
+
+// Everything fn(code) writes to standard output, or false when standard
+// output cannot be diverted (fn has not run then).
+bool capture_stdout(void (*fn)(status_code), status_code code, std::string &out) {
+    std::fflush(stdout);
+    std::FILE *tmp = std::tmpfile();
+    if (tmp == nullptr) return false;
+    const int saved = tool_dup(tool_fileno(stdout));
+    if (saved < 0 || tool_dup2(tool_fileno(tmp), tool_fileno(stdout)) < 0) {
+        if (saved >= 0) tool_close(saved);
+        std::fclose(tmp);
+        return false;
+    }
+    fn(code);
+    std::fflush(stdout);
+    tool_dup2(saved, tool_fileno(stdout));
+    tool_close(saved);
+
+    std::rewind(tmp);
+    char buffer[4096];
+    std::size_t n;
+    while ((n = std::fread(buffer, 1, sizeof buffer, tmp)) > 0) out.append(buffer, n);
+    std::fclose(tmp);
+    return true;
+}
+
+void display_error(status_code code) { sg_DisplayError(code); }
+
+// Takes apart "\nTemplate compiler error :\nMESSAGE\nFile: PATH    Line: N\nSOURCE".
+Diagnostic parse_diagnostic(const std::string &text) {
+    static const std::string header = "Template compiler error :\n";
+    static const std::string file_tag = "File: ";
+    static const std::string line_tag = "    Line: ";
+    Diagnostic d;
+    std::size_t pos = text.find(header);
+    pos = pos == std::string::npos ? 0 : pos + header.size();
+    std::size_t end = text.find('\n', pos);
+    d.message = text.substr(pos, end == std::string::npos ? std::string::npos : end - pos);
+    if (end == std::string::npos || text.compare(end + 1, file_tag.size(), file_tag) != 0)
+        return d;
+    const std::size_t path_start = end + 1 + file_tag.size();
+    const std::size_t line_end = text.find('\n', path_start);
+    const std::string position = text.substr(path_start, line_end == std::string::npos
+                                                             ? std::string::npos
+                                                             : line_end - path_start);
+    const std::size_t tag = position.rfind(line_tag);
+    if (tag == std::string::npos) return d;
+    d.has_position = true;
+    d.file = position.substr(0, tag);
+    d.line = std::strtol(position.c_str() + tag + line_tag.size(), nullptr, 10);
+    if (line_end != std::string::npos) {
+        d.source = text.substr(line_end + 1);
+        while (!d.source.empty() && (d.source.back() == '\n' || d.source.back() == '\r'))
+            d.source.pop_back();
+    }
+    return d;
+}
+
+// Text between double quotes, with \\ \" \n \r \t, and every other byte
+// below 32 or above 126 written with the printf format `other`.
+std::string escaped(const std::string &text, const char *other) {
+    std::string out = "\"";
+    for (const char ch : text) {
+        const auto c = static_cast<unsigned char>(ch);
+        switch (c) {
+            case '\\': out += "\\\\"; break;
+            case '"': out += "\\\""; break;
+            case '\n': out += "\\n"; break;
+            case '\r': out += "\\r"; break;
+            case '\t': out += "\\t"; break;
+            default:
+                if (c < 32 || c > 126) {
+                    char code[8];
+                    std::snprintf(code, sizeof code, other, c);
+                    out += code;
+                } else {
+                    out += ch;
+                }
+        }
+    }
+    return out + "\"";
+}
+
+}  // namespace
+
+Diagnostic capture_diagnostic(status_code code) {
+    std::string text;
+    if (!capture_stdout(display_error, code, text)) {
+        sg_DisplayError(code);
+        Diagnostic d;
+        d.message = "(printed above)";
+        return d;
+    }
+    return parse_diagnostic(text);
+}
+
+std::string kind_name(std::uint16_t kind) {
+    switch (kind) {
+        case tk_number: return "number";
+        case tk_string: return "string";
+        case tk_operator: return "operator";
+        case tk_macro: return "macro";
+        case tk_end_of_input: return "end-of-input";
+        case tk_reserved_word: return "reserved-word";
+        case tk_new_identifier: return "identifier";
+        case tk_undeclared: return "undeclared";
+        case tk_hash_word: return "hash-word";
+        case tk_hash_definition: return "hash-definition";
+        case tk_pdf_string: return "pdf-string";
+        case tk_char: return "char";
+        case tk_end_of_line: return "end-of-line";
+        default: break;
+    }
+    if (kind >= tk_first_class && kind <= tk_last_class) return "class-" + std::to_string(kind);
+    return "kind-" + std::to_string(kind);
+}
+
+bool kind_has_value(std::uint16_t kind) {
+    return kind == tk_number || kind == tk_operator || kind == tk_reserved_word ||
+           (kind >= tk_undeclared && kind <= tk_last_class);
+}
+
+std::string operator_spelling(std::int32_t value) {
+    switch (value) {
+        case op_slash_equal: return "/=";
+        case op_or_or: return "||";
+        case op_and_and: return "&&";
+        case op_less_equal: return "<=";
+        case op_greater_equal: return ">=";
+        case op_shift_left: return "<<";
+        case op_shift_right: return ">>";
+        case op_dot_dot: return "..";
+        case op_xor_xor: return "^^";
+        case op_not_equal: return "!=";
+        default: return std::string(1, static_cast<char>(value & 0xFF));
+    }
+}
+
+std::string quoted(const std::string &text) { return escaped(text, "\\x%02x"); }
+
+std::string json_string(const std::string &text) { return escaped(text, "\\u%04x"); }
+
+std::string hex_code(status_code code) {
+    char buffer[16];
+    std::snprintf(buffer, sizeof buffer, "0x%08x", static_cast<unsigned>(code));
+    return buffer;
+}
+
+}  // namespace tplex::tool

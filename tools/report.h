@@ -1,0 +1,47 @@
+// How the tool shows what the lexer delivers: token kind names, escaped
+// texts, JSON strings, and the diagnostic of a failure as sg_DisplayError
+// prints it, taken apart into message and position.
+#ifndef TPLEX_TOOLS_REPORT_H
+#define TPLEX_TOOLS_REPORT_H
+
+#include <cstdint>
+#include <string>
+
+#include "tplex/lexer.h"
+
+namespace tplex::tool {
+
+// What sg_DisplayError printed for one failure.
+struct Diagnostic {
+    std::string message;       // its message line ("Bad Character", "unspecified error: ...")
+    bool has_position = false; // false for a code printed without one
+    std::string file;          // the "File:" of the diagnostic
+    long line = 0;             // its "Line:"
+    std::string source;        // the source line it showed, without its line feed
+};
+
+// Runs sg_DisplayError(code) with standard output diverted, and takes what
+// it printed apart. When the output cannot be diverted, the diagnostic is
+// printed as it is and the result holds the message only.
+Diagnostic capture_diagnostic(status_code code);
+
+// The tool's name of a token kind ("identifier", "reserved-word", ...).
+std::string kind_name(std::uint16_t kind);
+// True for the kinds whose value field the scanner or the dictionary sets.
+bool kind_has_value(std::uint16_t kind);
+// The spelling of an operator token from its value ("<=", ";").
+std::string operator_spelling(std::int32_t value);
+
+// Text between double quotes with C escapes: \\ \" \n \r \t, and \xNN for
+// every other byte below 32 or above 126. Always one line.
+std::string quoted(const std::string &text);
+// A JSON string literal. Bytes above 127 become the code points of the
+// same number (the text read as Latin-1), so the result is valid UTF-8.
+std::string json_string(const std::string &text);
+
+// "0xd3470207": a status code as lower-case hexadecimal.
+std::string hex_code(status_code code);
+
+}  // namespace tplex::tool
+
+#endif
