@@ -29,7 +29,7 @@ endfunction()
 function(tplex_add_cross_test name data_dir)
   tplex_target_path(data ${data_dir})
   add_test(NAME ${name} COMMAND ${name})
-  set_tests_properties(${name} PROPERTIES ENVIRONMENT "TPLEX_TEST_DATA=${data}")
+  set_tests_properties(${name} PROPERTIES ENVIRONMENT "TPLEX_TEST_DATA=${data}" TIMEOUT 600)
 endfunction()
 
 # tplex_host_command(OUT TARGET): a command that host scripts can run like the
