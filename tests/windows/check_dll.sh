@@ -1,14 +1,16 @@
 #!/usr/bin/env bash
 # Checks the binary interface of tplex.dll from its headers and code:
 #   - the export table holds exactly the sixteen names, undecorated;
-#   - it imports nothing but Windows' own DLLs (no MinGW runtime DLLs);
+#   - it imports nothing but Windows' own DLLs (no MinGW runtime DLLs), and
+#     neither do the programs named after it (the tool);
 #   - each exported function is caller-cleans (__cdecl): a callee-cleans
 #     function ends in "ret $n" and carries an "@n" suffix in its symbol.
 #
-#   check_dll.sh OBJDUMP DLL
+#   check_dll.sh OBJDUMP DLL [PROGRAM...]
 set -euo pipefail
 objdump=$1
 dll=$2
+shift 2
 
 expected="back_token
 dict_check
@@ -46,12 +48,19 @@ fi
 addresses=$(grep -c 'Export RVA' <<<"$headers" || true)
 [ "$addresses" = 16 ] || fail "export address table has $addresses entries, not 16"
 
-imports=$(awk '/DLL Name:/ { print tolower($3) }' <<<"$headers" | sort -u)
-for dll_name in $imports; do
-    case " $allowed_imports " in
-        *" $dll_name "*) ;;
-        *) fail "imports $dll_name" ;;
-    esac
+imports_of() { awk '/DLL Name:/ { print tolower($3) }' | sort -u; }
+check_imports() {  # file, its imports
+    for dll_name in $2; do
+        case " $allowed_imports " in
+            *" $dll_name "*) ;;
+            *) fail "$(basename "$1") imports $dll_name" ;;
+        esac
+    done
+}
+imports=$(imports_of <<<"$headers")
+check_imports "$dll" "$imports"
+for program in "$@"; do
+    check_imports "$program" "$("$objdump" -p "$program" | imports_of)"
 done
 
 # The code of each export, up to the next symbol.
@@ -71,4 +80,4 @@ if [ "$failed" -ne 0 ]; then
     echo "tplex.dll: binary interface check failed"
     exit 1
 fi
-echo "tplex.dll: 16 undecorated __cdecl exports; imports: $(echo $imports)"
+echo "tplex.dll: 16 undecorated __cdecl exports; it and $# program(s) import only: $allowed_imports"
