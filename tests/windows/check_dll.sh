@@ -4,7 +4,9 @@
 #   - it imports nothing but Windows' own DLLs (no MinGW runtime DLLs), and
 #     neither do the programs named after it (the tool);
 #   - each exported function is caller-cleans (__cdecl): a callee-cleans
-#     function ends in "ret $n" and carries an "@n" suffix in its symbol.
+#     function ends in "ret $n" and carries an "@n" suffix in its symbol;
+#   - loading it runs no code of the library's own: its constructor list
+#     holds nothing but the runtime's registration of unwind tables.
 #
 #   check_dll.sh OBJDUMP DLL [PROGRAM...]
 set -euo pipefail
@@ -75,6 +77,39 @@ for name in $expected; do
         fail "$name removes its own arguments (ret \$n): not __cdecl"
     fi
 done
+
+# The constructor list: all ones, the constructors' addresses, zero.
+symbols=$("$objdump" -t "$dll")
+symbol_field() {  # name, field: "sec" number or "value"
+    awk -v name="$1" -v field="$2" '$NF == name {
+        if (field == "sec") { match($0, /\(sec +[0-9]+\)/); s = substr($0, RSTART + 4, RLENGTH - 5); print s + 0 }
+        else print $(NF - 1)
+        exit }' <<<"$symbols"
+}
+list=$(symbol_field ___CTOR_LIST__ value)
+list_end=$(symbol_field ___DTOR_LIST__ value)
+section=$(symbol_field ___CTOR_LIST__ sec)
+if [ -z "$list" ] || [ -z "$list_end" ]; then
+    fail "no constructor list found (the DLL stripped?)"
+else
+    section_name=$("$objdump" -h "$dll" | awk -v n=$((section - 1)) '$1 == n { print $2 }')
+    vma=$("$objdump" -h "$dll" | awk -v n=$((section - 1)) '$1 == n { print $4 }')
+    words=$("$objdump" -s -j "$section_name" --start-address=$((0x$vma + list)) \
+        --stop-address=$((0x$vma + list_end)) "$dll" |
+        awk '/^ [0-9a-f]+ / { for (i = 2; i <= 5 && length($i) == 8 && $i ~ /^[0-9a-f]+$/; ++i) print $i }')
+    for word in $words; do
+        # Little-endian: the bytes as printed, reversed.
+        address=$((0x${word:6:2}${word:4:2}${word:2:2}${word:0:2}))
+        [ "$address" = $((0xffffffff)) ] || [ "$address" = 0 ] && continue
+        offset=$(printf '0x%08x' $((address - 0x$vma)))
+        name=$(awk -v sec="$(printf '(sec %2d)' "$section")" -v value="$offset" \
+            'index($0, sec) && $(NF - 1) == value && $0 ~ /\(ty +20\)/ { print $NF; exit }' <<<"$symbols")
+        case "$name" in
+            _register_frame_ctor) ;;
+            *) fail "loading the DLL runs ${name:-the code at $offset}" ;;
+        esac
+    done
+fi
 
 if [ "$failed" -ne 0 ]; then
     echo "tplex.dll: binary interface check failed"
