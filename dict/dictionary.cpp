@@ -6,6 +6,7 @@
 #include <emmintrin.h>
 #endif
 
+#include "lex/hot.h"
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
@@ -39,38 +40,52 @@ std::uint16_t hash_key(const char *name, std::size_t n) {
 }
 
 #if defined(__SSE2__)
-// The hash of a key of at most 16 characters (signed bytes are not needed:
-// the scanner's words are ASCII) followed by zero bytes to 16: the weighted
-// sum as one multiply-add over 16 lanes, with weights per length.
-struct padded_weights {
-    alignas(16) std::int16_t w[17][16];  // w[n][i]: the weight of character i of n
-    std::uint16_t bias[17];              // 48 times the weights' sum, plus 17 x 64
+// The hash of an ASCII key followed by 16 zero bytes, 16 characters at a
+// time as one multiply-add. Character i of n weighs 64 >> ((n - 1 - i) % 7),
+// so the chunk that starts at character s is weighted by row (n - 1 - s) % 7
+// of a table of 7 rows; the zero bytes past the key count nothing. The
+// bias folds in the 48 subtracted from every character and the 17 more from
+// the last one.
+struct chunk_weights {
+    alignas(16) std::int16_t row[7][16];  // row[m][i] = 64 >> ((m - i) mod 7)
+    std::uint16_t bias[word_max + 1];     // 48 times the weights of n characters, plus 17 x 64
 };
 
-constexpr padded_weights make_padded_weights() {
-    padded_weights t{};
-    for (int n = 1; n <= 16; ++n) {
-        int sum = 0;
-        for (int i = 0; i < n; ++i) {
-            const int d = n - 1 - i;
-            t.w[n][i] = static_cast<std::int16_t>(64 >> (d % 7));
-            sum += t.w[n][i];
-        }
+constexpr chunk_weights make_chunk_weights() {
+    chunk_weights t{};
+    for (int m = 0; m < 7; ++m)
+        for (int i = 0; i < 16; ++i) t.row[m][i] = static_cast<std::int16_t>(64 >> (((m - i) % 7 + 7) % 7));
+    int sum = 0;
+    for (int n = 1; n <= word_max; ++n) {
+        sum += 64 >> ((n - 1) % 7);
         t.bias[n] = static_cast<std::uint16_t>(48 * sum + 17 * 64);
     }
     return t;
 }
-constexpr padded_weights weights16 = make_padded_weights();
+constexpr chunk_weights weights = make_chunk_weights();
 
-inline std::uint16_t hash_padded16(const char *key, std::size_t n) {
+inline __m128i weigh_chunk(const char *chunk, const std::int16_t *row) {
     const __m128i zero = _mm_setzero_si128();
-    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(key));
-    const __m128i *w = reinterpret_cast<const __m128i *>(weights16.w[n]);
-    const __m128i sum = _mm_add_epi32(_mm_madd_epi16(_mm_unpacklo_epi8(x, zero), w[0]),
-                                      _mm_madd_epi16(_mm_unpackhi_epi8(x, zero), w[1]));
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(chunk));
+    const __m128i *w = reinterpret_cast<const __m128i *>(row);
+    return _mm_add_epi32(_mm_madd_epi16(_mm_unpacklo_epi8(x, zero), w[0]),
+                         _mm_madd_epi16(_mm_unpackhi_epi8(x, zero), w[1]));
+}
+
+inline std::uint16_t hash_padded(const char *key, std::size_t n) {
+    // Most words fit one chunk; its row comes from a small table, not a division.
+    static constexpr std::uint8_t first_row[17] = {0, 0, 1, 2, 3, 4, 5, 6, 0, 1, 2, 3, 4, 5, 6, 0, 1};
+    __m128i sum;
+    if (n <= 16) {
+        sum = weigh_chunk(key, weights.row[first_row[n]]);
+    } else {
+        sum = _mm_setzero_si128();
+        for (std::size_t start = 0; start < n; start += 16)
+            sum = _mm_add_epi32(sum, weigh_chunk(key + start, weights.row[(n - 1 - start) % 7]));
+    }
     const __m128i pairs = _mm_add_epi32(sum, _mm_shuffle_epi32(sum, 0x4E));
     const __m128i total = _mm_add_epi32(pairs, _mm_shuffle_epi32(pairs, 0xB1));
-    return static_cast<std::uint16_t>(_mm_cvtsi128_si32(total) - weights16.bias[n]);
+    return static_cast<std::uint16_t>(_mm_cvtsi128_si32(total) - weights.bias[n]);
 }
 #endif
 
@@ -93,7 +108,7 @@ inline bool same_padded(const char *a, const char *b, std::size_t n) {
 template <bool padded>
 std::uint16_t probe(const char *key, std::size_t n, bool &found) {
 #if defined(__SSE2__)
-    const std::uint16_t h = padded && n >= 1 && n <= 16 ? hash_padded16(key, n) : hash_key(key, n);
+    const std::uint16_t h = padded && n >= 1 ? hash_padded(key, n) : hash_key(key, n);
 #else
     const std::uint16_t h = hash_key(key, n);
 #endif
@@ -117,7 +132,7 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
 }
 
 // A found entry describes itself in current_token.
-void show_entry(const dict_entry &e, bool text_is_name) {
+TPLEX_HOT_INLINE void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
     if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);

@@ -8,12 +8,15 @@
 #endif
 
 #include "dict/dictionary.h"
+#include "lex/hot.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
+#include "scan/directives.h"
 
 namespace tplex {
 
 namespace {
+
 
 // Character classes. Codes from 128 up are in none of the first four.
 enum : std::uint8_t {
@@ -71,7 +74,7 @@ token_record &tok = current_token;
 // an identifier character is never a comment bracket, and a word ends where
 // its buffer (a line piece or a body) ends. Every buffer the cursor reads
 // has 16 readable bytes from its NUL on, so 16 bytes can be looked at once.
-std::size_t take_ident_chars(std::size_t n) {
+TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
     char *t = tok.text;
 #if defined(__SSE2__)
@@ -108,7 +111,7 @@ std::size_t take_ident_chars(std::size_t n) {
 }
 
 // A word: looked up, and expanded in place when it names a body.
-status_code scan_word(std::uint8_t c) {
+TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c) {
     tok.text[0] = upper[c];
     const std::size_t n = take_ident_chars(1);
     if (dict_lookup_token(n) != 1) tok.kind = tk_new_identifier;
@@ -288,15 +291,45 @@ void skip_comment(const std::array<bool, 256> &stops) {
 void skip_block_comment() { skip_comment<ch_comment_close, ch_comment_close>(block_stops); }
 void skip_line_comment() { skip_comment<'\n', '\n'>(line_stops); }
 
-inline status_code scan() {
+inline bool is_blank(std::uint8_t c) { return c == ' ' || c == '\t'; }
+
+// Skips blanks straight from the buffer: one or two one at a time, a longer
+// run (indentation) 16 at a time.
+inline void skip_blanks() {
+    const unsigned char *p = read_cursor;
+    if (!is_blank(*p)) return;
+    if (!is_blank(*++p)) {
+        read_cursor = p;
+        return;
+    }
+#if defined(__SSE2__)
+    const __m128i space = _mm_set1_epi8(' '), tab = _mm_set1_epi8('\t');
+    for (;;) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const unsigned blank = static_cast<unsigned>(
+            _mm_movemask_epi8(_mm_or_si128(_mm_cmpeq_epi8(x, space), _mm_cmpeq_epi8(x, tab))));
+        if (blank != 0xFFFFu) {
+            read_cursor = p + __builtin_ctz(~blank);
+            return;
+        }
+        p += 16;
+    }
+#else
+    while (is_blank(*p)) ++p;
+    read_cursor = p;
+#endif
+}
+
+// One scan. The filter drops every end of line, so it asks for them to be
+// skipped here rather than returned one by one.
+template <bool skip_line_ends>
+TPLEX_HOT_INLINE status_code scan() {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
     }
     for (;;) {
-        const unsigned char *p = read_cursor;
-        while (*p == ' ' || *p == '\t') ++p;  // blanks, straight from the buffer
-        read_cursor = p;
+        skip_blanks();
         const std::uint8_t c = next_char();
         status_code result;
         if (is_letter(c)) {
@@ -310,6 +343,7 @@ inline status_code scan() {
                     continue;
                 case ch_end_of_body:
                 case '\n':
+                    if (skip_line_ends) continue;
                     return tk_end_of_line;
                 case ch_comment_open:
                     skip_block_comment();
@@ -376,6 +410,28 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token() { return scan(); }
+status_code scan_token() { return scan<false>(); }
+
+// The filter between the scanner and the parser, here so the scan inlines
+// into it: hash words are executed, ends of line dropped (the scan passes
+// over them itself), the end of input delivered whatever the region, and
+// every other result delivered in a live region and dropped in a dead one.
+status_code next_token_filtered() {
+    status_code r;
+    for (;;) {
+        r = scan<true>();
+        if (r == tk_hash_word) {
+            const status_code d = process_hash_directive();
+            if (d < 0) {
+                r = d;
+                break;
+            }
+            continue;
+        }
+        if (r == tk_end_of_input || (r != tk_end_of_line && region_live())) break;
+    }
+    char_source_store();  // the frame's read_pos is true whenever the parser looks
+    return r;
+}
 
 }  // namespace tplex

@@ -105,8 +105,9 @@ bool read_line_unbuffered(std::FILE *file, char *line, std::size_t capacity) {
         line[out++] = static_cast<char>(c);
         if (c == '\n') break;
     }
+    if (out == 0) return false;
     line[out] = '\0';
-    return out > 0;
+    return true;
 }
 
 }  // namespace
@@ -150,12 +151,11 @@ int close_source(std::FILE *file) {
     return std::fclose(file) != 0 ? 1 : 0;
 }
 
-// A capacity below 2 has no room for a character: nothing is read (and a
-// capacity of 1 gets an empty text).
+// A capacity below 2 has no room for a character: nothing is read. As with
+// the C library's line reader, a read that gets no character leaves the line
+// as it was.
 bool read_line(std::FILE *file, char *line, std::size_t capacity) {
-    if (line == nullptr || capacity == 0) return false;
-    line[0] = '\0';
-    if (file == nullptr || capacity == 1) return false;
+    if (line == nullptr || capacity < 2 || file == nullptr) return false;
     stream_state *s = find_slot(file);
     if (s == nullptr) return read_line_unbuffered(file, line, capacity);
 
@@ -197,8 +197,9 @@ bool read_line(std::FILE *file, char *line, std::size_t capacity) {
         }
         find_next_cr(*s);
     }
+    if (out == 0) return false;
     line[out] = '\0';
-    return out > 0;
+    return true;
 }
 
 }  // namespace tplex::platform

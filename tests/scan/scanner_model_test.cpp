@@ -44,7 +44,33 @@ struct Model {
         char line[5000] = {};
         std::uint16_t pos = 0;
         std::uint32_t line_no = 0xFFFFFFFFu;
+        bool ended = false;  // a 0x1A byte ends the file for good
     };
+
+    // One line in text mode, a character at a time: CR LF arrives as LF,
+    // 0x1A ends the file, at most 4999 characters, stopping after a LF.
+    static bool read_line(File &f) {
+        std::size_t n = 0;
+        while (n < 4999 && !f.ended) {
+            int c = std::getc(f.f);
+            if (c == EOF) break;
+            if (c == 0x1A) {
+                f.ended = true;
+                break;
+            }
+            if (c == '\r') {
+                const int next = std::getc(f.f);
+                if (next == '\n')
+                    c = '\n';
+                else if (next != EOF)
+                    std::ungetc(next, f.f);
+            }
+            f.line[n++] = static_cast<char>(c);
+            if (c == '\n') break;
+        }
+        f.line[n] = '\0';
+        return n > 0;
+    }
     std::vector<Body> bodies;
     std::vector<File> files;
     Record rec;
@@ -66,7 +92,7 @@ struct Model {
         if (files.empty()) return 255;
         File *f = &files.back();
         if (f->line_no == 0xFFFFFFFFu || f->line[f->pos] == 0) {
-            while (std::fgets(f->line, 5000, f->f) == nullptr) {
+            while (!read_line(*f)) {
                 std::fclose(f->f);
                 files.pop_back();
                 if (files.empty()) return 255;

@@ -505,15 +505,15 @@ TEST(ScanToken, ALineCommentTakesItsLineFeed) {
     EXPECT_EQ(tplex::scan_token(), tk_end_of_line);
 }
 
-TEST(ScanToken, TheReadPositionIsInTheFrameAfterEachScan) {
+TEST(ScanToken, TheReadPositionIsInTheFrameAfterEachToken) {
     LexSession s;
     ASSERT_EQ(s.open("abc def\n"), 1);
-    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    EXPECT_EQ(sc_next_token(), tk_new_identifier);
     source_frame *frames = nullptr;
     sc_lex_setup(nullptr, &frames, nullptr, nullptr, nullptr);
     EXPECT_EQ(frames[1].read_pos, 3);
     EXPECT_EQ(frames[1].line_no, 0u);
-    EXPECT_EQ(tplex::scan_token(), tk_new_identifier);
+    EXPECT_EQ(sc_next_token(), tk_new_identifier);
     EXPECT_EQ(frames[1].read_pos, 7);
 }
 
