@@ -6,7 +6,7 @@
 #include <emmintrin.h>
 #endif
 
-#include "lex/hot.h"
+#include "lex/compiler.h"
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"

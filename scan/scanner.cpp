@@ -9,7 +9,7 @@
 #endif
 
 #include "dict/dictionary.h"
-#include "lex/hot.h"
+#include "lex/compiler.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
