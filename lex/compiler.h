@@ -13,11 +13,13 @@
 // printf-style argument checking. MinGW checks against the formats of the C
 // library it links (which know %zu), not Microsoft's.
 #if defined(__MINGW32__)
-#define TPLEX_PRINTF_FORMAT(format, first) __attribute__((format(__MINGW_PRINTF_FORMAT, format, first)))
+#define TPLEX_PRINTF_FORMAT(string_index, first_to_check) \
+    __attribute__((format(__MINGW_PRINTF_FORMAT, string_index, first_to_check)))
 #elif defined(__GNUC__)
-#define TPLEX_PRINTF_FORMAT(format, first) __attribute__((format(printf, format, first)))
+#define TPLEX_PRINTF_FORMAT(string_index, first_to_check) \
+    __attribute__((format(printf, string_index, first_to_check)))
 #else
-#define TPLEX_PRINTF_FORMAT(format, first)
+#define TPLEX_PRINTF_FORMAT(string_index, first_to_check)
 #endif
 
 #endif
