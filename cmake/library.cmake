@@ -26,6 +26,9 @@ set_target_properties(tplex_static PROPERTIES OUTPUT_NAME tplex)
 if(WIN32)
   # The DLL needs nothing but Windows' own DLLs.
   target_link_options(tplex PRIVATE -static-libgcc -static-libstdc++ -static)
+  # Only the sixteen functions marked dllexport by tplex/lexer.h: without a
+  # marked symbol the linker would export every global symbol.
+  target_link_options(tplex PRIVATE "LINKER:--exclude-all-symbols")
   set_target_properties(tplex PROPERTIES PREFIX "" IMPORT_PREFIX "lib")
   # On Windows the static archive and the DLL's import library would both be
   # libtplex.a; the archive keeps that name only where there is no DLL.

@@ -6,6 +6,7 @@
 #include <emmintrin.h>
 #endif
 
+#include "lex/compiler.h"
 #include "lex/lexer.h"
 #include "lex/memory.h"
 #include "lex/text.h"
@@ -131,7 +132,7 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
 }
 
 // A found entry describes itself in current_token.
-void show_entry(const dict_entry &e, bool text_is_name) {
+TPLEX_HOT_INLINE void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
     if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
@@ -274,7 +275,8 @@ status_code dict_extend(const char *text1, const char *text2, const char *text3,
 
 status_code dict_create() {
     if (dict_slots != nullptr) return 0;
-    dict_slots = static_cast<dict_entry **>(mem_alloc(sizeof(dict_entry *) * dict_slot_count));
+    // An array of entry addresses.  NOLINTNEXTLINE(bugprone-sizeof-expression)
+    dict_slots = static_cast<dict_entry **>(mem_alloc(sizeof dict_slots[0] * dict_slot_count));
     if (dict_slots == nullptr) return TPLEX_MALLOC_FAILED;
     for (int s = 0; s < dict_slot_count; ++s) dict_slots[s] = nullptr;
     return 0;

@@ -26,7 +26,7 @@ struct hash_definition {
 
 // Room for a name of 128 characters, its NUL and zero padding to a whole
 // number of 8-byte words, so names compare a word at a time.
-inline constexpr std::size_t name_room = (word_max + 1 + 7) / 8 * 8;
+inline constexpr std::size_t name_room = (std::size_t{word_max} + 1 + 7) / 8 * 8;
 
 struct dict_entry {
     std::uint8_t kind;

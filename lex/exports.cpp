@@ -23,7 +23,7 @@ TPLEX_API status_code TPLEX_CALL sc_lex_setup(token_record **token, source_frame
     if (token != nullptr) *token = &tplex::current_token;
     if (frames != nullptr) *frames = tplex::source_stack;
     if (depth != nullptr) *depth = &tplex::source_depth;
-    if (reserved_words != nullptr) *reserved_words = tplex::reserved_word_table;
+    if (reserved_words != nullptr) *reserved_words = tplex::reserved_word_table.data();
     if (declare_enabled != nullptr) *declare_enabled = &tplex::declare_enabled;
     return 0;
 }

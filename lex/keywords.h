@@ -1,9 +1,10 @@
-// The language's vocabulary: 118 reserved words and 5 hash words, in the
-// parser-visible record layout, in writable storage (loading passes each
-// stored word to the dictionary's lookup, which upper-cases in place).
+// The language's vocabulary: 118 reserved words and 5 hash words. The
+// reserved words are also handed to the parser as a table of records in
+// writable storage.
 #ifndef TPLEX_LEX_KEYWORDS_H
 #define TPLEX_LEX_KEYWORDS_H
 
+#include <array>
 #include <cstdint>
 
 #include "lex/limits.h"
@@ -11,8 +12,8 @@
 
 namespace tplex {
 
-extern reserved_word_record reserved_word_table[reserved_word_count];
-extern reserved_word_record hash_word_table[hash_word_count];
+// 118 records back to back, code equal to index.
+extern std::array<reserved_word_record, reserved_word_count> reserved_word_table;
 
 // Insert one word as kind 9 (24), printing "\nReserved Word Duplicated"
 // ("\nHash Directive Duplicated") first when it is already present.

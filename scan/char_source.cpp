@@ -85,6 +85,25 @@ void char_source_sync() {
 void char_source_forget() { drop_cursor(); }
 
 std::uint8_t read_char_slow() {
+    // The common case first: the file line being read has ended (a valid
+    // file cursor means no body is pending and its frame is the current
+    // one) and the file has another line.
+    if (cursor_line_pos != nullptr) {
+        source_frame &f = source_stack[cur.index];
+        if (platform::read_line(f.file, f.line_text, line_size)) {
+            ++f.line_no;
+            const auto c = static_cast<std::uint8_t>(f.line_text[0]);
+            if (c != 0) {
+                f.read_pos = 1;
+                read_cursor = cursor_line + 1;
+                return c;
+            }
+            f.read_pos = 0;
+            drop_cursor();
+            return 0;  // a line that starts with a NUL byte
+        }
+        // The file has ended: the general path below closes it.
+    }
     char_source_sync();
 
     // Macro text first; a frame goes only once its NUL has been handed out.

@@ -20,13 +20,13 @@ namespace {
 
 token_record &tok = current_token;
 
-inline bool live() { return cond_stack[cond_depth] == 1; }
+
 
 // #include: opens the file named by the next token. Whatever follows the
 // name on the line is never read: the new file is read next, and when it
 // ends, reading resumes with the includer's next line.
 status_code do_include() {
-    if (!live()) return 0;  // the name is then skipped like any token
+    if (!region_live()) return 0;  // the name is then skipped like any token
     const status_code r = scan_token();
     if (r < 0) return r;
     char name[text_size];  // any token's text names the file
@@ -39,7 +39,7 @@ status_code do_include() {
 status_code do_ifdef(bool want_defined, std::uint8_t &flag) {
     status_code result = scan_token();
     flag = 0;
-    if (live()) {
+    if (region_live()) {
         if (tok.kind == tk_new_identifier)
             flag = want_defined ? 0 : 1;
         else if (tok.kind == tk_hash_definition)
@@ -120,7 +120,7 @@ status_code store_macro(const char *name, const char *body, status_code done) {
 status_code do_define() {
     scan_token();
     // The name and the body get one block: text_size for each.
-    char *name = static_cast<char *>(mem_alloc(2 * text_size));
+    char *name = static_cast<char *>(mem_alloc(2 * std::size_t{text_size}));
     if (name == nullptr) return TPLEX_MALLOC_FAILED;
     char *body = name + text_size;
     copy_text(name, text_size, tok.text);
@@ -128,7 +128,7 @@ status_code do_define() {
 
     status_code result = scan_token();
     if (result == tk_end_of_line) {
-        if (live()) {
+        if (region_live()) {
             if (dict_lookup(name) == 1)
                 result = TPLEX_UNEXPECTED_HASH_WORD;
             else if (name_kind == tk_new_identifier) {
@@ -147,7 +147,7 @@ status_code do_define() {
                 result = TPLEX_MACRO_REDEFINED;
             } else {
                 result = last_scan;
-                if (live()) result = store_macro(name, body, last_scan);
+                if (region_live()) result = store_macro(name, body, last_scan);
             }
         }
     }
@@ -178,33 +178,6 @@ status_code process_hash_directive() {
             cond_stack[++cond_depth] = flag;
     }
     return result;
-}
-
-namespace {
-
-status_code filter() {
-    for (;;) {
-        // A switched-off region drops its tokens, so its names are not
-        // expanded: bodies that name bodies several times over would keep
-        // this one call busy for ever (four names 20 deep are 4^20 bodies).
-        const status_code r = scan_token_past_line_ends(live());
-        if (r == tk_hash_word) {
-            const status_code d = process_hash_directive();
-            if (d < 0) return d;
-            continue;
-        }
-        if (r == tk_end_of_input) return r;  // whatever the current flag
-        if (r == tk_end_of_line) continue;
-        if (live()) return r;
-    }
-}
-
-}  // namespace
-
-status_code next_token_filtered() {
-    const status_code r = filter();
-    char_source_store();  // the frame's read_pos is true whenever the parser looks
-    return r;
 }
 
 status_code sc_lex_init_defines(char **names, std::int32_t count) {

@@ -15,8 +15,12 @@ namespace tplex {
 extern std::uint8_t cond_stack[cond_flag_count];
 extern std::uint16_t cond_depth;
 
-// The next token the parser gets: its kind, or a failure code. The next
-// call goes on after the point where a failure happened.
+// True while tokens of the current region are delivered.
+inline bool region_live() { return cond_stack[cond_depth] == 1; }
+
+// The next token the parser gets (scan/scanner.cpp, where the filter loop
+// runs over the scanner): its kind, or a failure code. The next call goes on
+// after the point where a failure happened.
 status_code next_token_filtered();
 // Runs the hash word in current_token (its code in value). 0 or more to go
 // on, or a failure code.

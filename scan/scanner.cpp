@@ -1,5 +1,6 @@
 #include "scan/scanner.h"
 
+#include <algorithm>
 #include <array>
 #include <cstring>
 
@@ -8,19 +9,15 @@
 #endif
 
 #include "dict/dictionary.h"
+#include "lex/compiler.h"
 #include "lex/lexer.h"
 #include "scan/char_source.h"
+#include "scan/directives.h"
 
 namespace tplex {
 
 namespace {
 
-// The word path runs for every identifier: keep it in the scan loop.
-#if defined(__GNUC__)
-#define TPLEX_HOT_INLINE inline __attribute__((always_inline))
-#else
-#define TPLEX_HOT_INLINE inline
-#endif
 
 // Character classes. Codes from 128 up are in none of the first four.
 enum : std::uint8_t {
@@ -116,7 +113,8 @@ TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     return n;
 }
 
-// A word: looked up, and expanded in place when it names a body.
+// A word: looked up, and expanded in place when it names a body (unless
+// expand is false: the name is then a token of kind 4 like any other).
 TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c, bool expand) {
     tok.text[0] = upper[c];
     const std::size_t n = take_ident_chars(1);
@@ -179,15 +177,48 @@ status_code scan_number(std::uint8_t c, bool negative) {
     return tk_number;
 }
 
-// Bytes that end a plain run inside a string: the quote, the comment
-// bracket characters (the character source folds them), the ends of a
-// buffer and of input.
-constexpr std::array<bool, 256> make_string_stops() {
-    std::array<bool, 256> t{};
-    t[0] = t['"'] = t['/'] = t['*'] = t[ch_end_of_input] = true;
-    return t;
+// A set of bytes that ends a run of characters the scanner can take
+// straight from the buffer. The NUL that ends every buffer is always in it,
+// so a run never passes its buffer's end.
+struct stop_set {
+    std::array<bool, 256> table;
+    std::array<unsigned char, 5> bytes;  // the same set, for the 16-byte search
+};
+
+constexpr stop_set make_stops(unsigned char a, unsigned char b, unsigned char c, unsigned char d) {
+    stop_set s{};
+    s.bytes = {0, a, b, c, d};
+    for (unsigned char x : s.bytes) s.table[x] = true;
+    return s;
 }
-constexpr std::array<bool, 256> string_stops = make_string_stops();
+
+// The first byte at or after p that is in the set. Every buffer the cursor
+// reads has 16 readable bytes from its NUL on.
+inline const unsigned char *run_end(const unsigned char *p, const stop_set &s) {
+#if defined(__SSE2__)
+    const __m128i b0 = _mm_set1_epi8(static_cast<char>(s.bytes[0]));
+    const __m128i b1 = _mm_set1_epi8(static_cast<char>(s.bytes[1]));
+    const __m128i b2 = _mm_set1_epi8(static_cast<char>(s.bytes[2]));
+    const __m128i b3 = _mm_set1_epi8(static_cast<char>(s.bytes[3]));
+    const __m128i b4 = _mm_set1_epi8(static_cast<char>(s.bytes[4]));
+    for (;; p += 16) {
+        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+        const __m128i hit = _mm_or_si128(
+            _mm_or_si128(_mm_cmpeq_epi8(x, b0), _mm_cmpeq_epi8(x, b1)),
+            _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(x, b2), _mm_cmpeq_epi8(x, b3)),
+                         _mm_cmpeq_epi8(x, b4)));
+        const unsigned m = static_cast<unsigned>(_mm_movemask_epi8(hit));
+        if (m != 0) return p + __builtin_ctz(m);
+    }
+#else
+    while (!s.table[*p]) ++p;
+    return p;
+#endif
+}
+
+// Inside a string: the quote, and the comment bracket characters (the
+// character source folds them into markers).
+constexpr stop_set string_stops = make_stops('"', '/', '*', ch_end_of_input);
 
 // A string or PDF string, the opening quote (and "<") already taken. Line
 // feeds and comment marker codes are ordinary characters here.
@@ -198,11 +229,11 @@ status_code scan_string(bool pdf) {
     while (!complete && result == keep_scanning) {
         // A run of plain characters, straight from the buffer.
         const unsigned char *p = read_cursor;
-        while (!string_stops[*p]) {
-            if (n < string_max) tok.text[n++] = static_cast<char>(*p);
-            ++p;
-        }
-        read_cursor = p;
+        const unsigned char *end = run_end(p, string_stops);
+        const std::size_t take = std::min(static_cast<std::size_t>(end - p), string_max - n);
+        std::memcpy(tok.text + n, p, take);
+        n += take;
+        read_cursor = end;
 
         std::uint8_t c = next_char();
         if (c == '"') {
@@ -262,40 +293,95 @@ inline status_code op_pair(std::uint8_t second, int32_t pair, int32_t single) {
     return op(pair);
 }
 
-// Bytes a comment cannot simply pass over: the ends of a buffer and of
-// input, the closing bytes, and the bracket characters, which the
-// character source may fold into a marker.
-constexpr std::array<bool, 256> make_block_stops() {
-    std::array<bool, 256> t{};
-    t[0] = t['/'] = t['*'] = t[ch_comment_close] = t[ch_end_of_input] = true;
-    return t;
-}
-constexpr std::array<bool, 256> block_stops = make_block_stops();
+// What a character starts, for the scan's one dispatch. Every byte that
+// starts no token (control characters, "$", "?", "@", backslash, "_", the
+// grave accent, 127 and up, "*/" outside a comment, 254) is cl_bad.
+enum : std::uint8_t {
+    cl_bad,
+    cl_letter,
+    cl_digit,
+    cl_blank,
+    cl_end_of_line,   // a line feed, or the end of a body
+    cl_comment,       // "/*"
+    cl_line_comment,  // "//"
+    cl_end_of_input,
+    cl_quote,
+    cl_apostrophe,
+    cl_hash,
+    cl_minus,
+    cl_less,
+    cl_greater,
+    cl_pair,          // an operator alone, or paired with one second character
+    cl_single,        // an operator of one character only
+    cl_slash,         // "/", which may also open a comment
+    cl_star,          // "*", which may also close one
+};
 
-// A fold never consumes a line feed, so a line comment needs no brackets.
-constexpr std::array<bool, 256> make_line_stops() {
-    std::array<bool, 256> t{};
-    t[0] = t['\n'] = t[ch_end_of_input] = true;
+struct pair_op {
+    std::uint8_t second;  // the character that makes the pair
+    std::int32_t value;   // the pair's operator value
+};
+
+constexpr std::array<pair_op, 256> make_pairs() {
+    std::array<pair_op, 256> t{};
+    t['!'] = {'=', op_not_equal};
+    t['&'] = {'&', op_and_and};
+    t['.'] = {'.', op_dot_dot};
+    t['^'] = {'^', op_xor_xor};
+    t['|'] = {'|', op_or_or};
     return t;
 }
-constexpr std::array<bool, 256> line_stops = make_line_stops();
+constexpr std::array<pair_op, 256> pairs = make_pairs();
+
+constexpr std::array<std::uint8_t, 256> make_dispatch() {
+    std::array<std::uint8_t, 256> t{};
+    for (int c = 0; c < 256; ++c) {
+        if (classes[c] & cc_letter) t[c] = cl_letter;
+        if (classes[c] & cc_digit) t[c] = cl_digit;
+        if (pairs[c].second != 0) t[c] = cl_pair;
+    }
+    t[' '] = t['\t'] = cl_blank;
+    t[ch_end_of_body] = t['\n'] = cl_end_of_line;
+    t[ch_comment_open] = cl_comment;
+    t[ch_line_comment] = cl_line_comment;
+    t[ch_end_of_input] = cl_end_of_input;
+    t['"'] = cl_quote;
+    t['\''] = cl_apostrophe;
+    t['#'] = cl_hash;
+    t['-'] = cl_minus;
+    t['<'] = cl_less;
+    t['>'] = cl_greater;
+    t['/'] = cl_slash;
+    t['*'] = cl_star;
+    for (unsigned char c : {'%', '(', ')', '+', ',', ':', ';', '=', '[', ']', '{', '}', '~'})
+        t[c] = cl_single;
+    return t;
+}
+constexpr std::array<std::uint8_t, 256> dispatch = make_dispatch();
+static_assert(dispatch['_'] == cl_bad && dispatch['$'] == cl_bad && dispatch['\r'] == cl_bad);
+static_assert(dispatch[ch_comment_close] == cl_bad && dispatch[254] == cl_bad && dispatch[128] == cl_bad);
+static_assert(dispatch['/'] == cl_slash && dispatch['*'] == cl_star && dispatch['z'] == cl_letter);
+
+// A comment cannot simply pass over the closing bytes, nor the bracket
+// characters, which the character source may fold into a marker.
+constexpr stop_set block_stops = make_stops('/', '*', ch_comment_close, ch_end_of_input);
+// A fold never consumes a line feed, so a line comment needs no brackets.
+constexpr stop_set line_stops = make_stops('\n', ch_end_of_input, ch_end_of_input, ch_end_of_input);
 
 // Takes characters up to and including the first of the ends.
-template <std::uint8_t end1, std::uint8_t end2>
-void skip_comment(const std::array<bool, 256> &stops) {
+template <std::uint8_t end>
+void skip_comment(const stop_set &stops) {
     for (;;) {
-        const unsigned char *p = read_cursor;
-        while (!stops[*p]) ++p;
-        read_cursor = p;
+        read_cursor = run_end(read_cursor, stops);
         const std::uint8_t c = next_char();
-        if (c == end1 || c == end2 || c == ch_end_of_body || c == ch_end_of_input) return;
+        if (c == end || c == ch_end_of_body || c == ch_end_of_input) return;
     }
 }
 
 // A block comment ends at "*/" (or the end of a body or of input); a line
 // comment takes its line feed, so no end of line follows it.
-void skip_block_comment() { skip_comment<ch_comment_close, ch_comment_close>(block_stops); }
-void skip_line_comment() { skip_comment<'\n', '\n'>(line_stops); }
+void skip_block_comment() { skip_comment<ch_comment_close>(block_stops); }
+void skip_line_comment() { skip_comment<'\n'>(line_stops); }
 
 inline bool is_blank(std::uint8_t c) { return c == ' ' || c == '\t'; }
 
@@ -329,72 +415,83 @@ inline void skip_blanks() {
 // One scan. The filter drops every end of line, so it asks for them to be
 // skipped here rather than returned one by one.
 template <bool skip_line_ends>
-inline status_code scan(bool expand) {
+TPLEX_HOT_INLINE status_code scan(bool expand) {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
     }
     for (;;) {
         skip_blanks();
-        const std::uint8_t c = next_char();
+        // read_char, not next_char: the comment brackets are folded below,
+        // in the two cases that can start one.
+        const std::uint8_t c = read_char();
         status_code result;
-        if (is_letter(c)) {
-            result = scan_word(c, expand);
-        } else if (is_digit(c)) {
-            result = scan_number(c, false);
-        } else {
-            switch (c) {
-                case ' ':
-                case '\t':
-                    continue;
-                case ch_end_of_body:
-                case '\n':
-                    if (skip_line_ends) continue;
-                    return tk_end_of_line;
-                case ch_comment_open:
+        switch (dispatch[c]) {
+            case cl_letter:
+                result = scan_word(c, expand);
+                if (result != keep_scanning) return result;
+                continue;  // a name's body is being read, or a word of kind 0
+            case cl_digit:
+                return scan_number(c, false);
+            case cl_blank:
+                continue;
+            case cl_end_of_line:
+                if (skip_line_ends) continue;
+                return tk_end_of_line;
+            case cl_comment:
+                skip_block_comment();
+                continue;
+            case cl_line_comment:
+                skip_line_comment();
+                continue;
+            case cl_end_of_input:
+                tok.kind = tk_end_of_input;
+                return tk_end_of_input;
+            case cl_quote:
+                return scan_string(false);
+            case cl_apostrophe:
+                return scan_char_literal();
+            case cl_hash:
+                return scan_hash_word();
+            case cl_minus:
+                if (is_digit(peek_char())) return scan_number(next_char(), true);
+                return op('-');
+            case cl_less:
+                if (peek_char() == '=') return op_pair('=', op_less_equal, '<');
+                if (peek_char() == '<') return op_pair('<', op_shift_left, '<');
+                if (peek_char() == '"') {
+                    next_char();
+                    return scan_string(true);
+                }
+                return op('<');
+            case cl_greater:
+                if (peek_char() == '=') return op_pair('=', op_greater_equal, '>');
+                return op_pair('>', op_shift_right, '>');
+            case cl_slash:
+                if (peek_char() == '*') {
+                    read_char();
                     skip_block_comment();
                     continue;
-                case ch_line_comment:
+                }
+                if (peek_char() == '/') {
+                    read_char();
                     skip_line_comment();
                     continue;
-                case ch_end_of_input:
-                    tok.kind = tk_end_of_input;
-                    return tk_end_of_input;
-                case '"':
-                    return scan_string(false);
-                case '\'':
-                    return scan_char_literal();
-                case '#':
-                    return scan_hash_word();
-                case '-':
-                    if (is_digit(peek_char())) return scan_number(next_char(), true);
-                    return op('-');
-                case '<':
-                    if (peek_char() == '=') return op_pair('=', op_less_equal, '<');
-                    if (peek_char() == '<') return op_pair('<', op_shift_left, '<');
-                    if (peek_char() == '"') {
-                        next_char();
-                        return scan_string(true);
-                    }
-                    return op('<');
-                case '>':
-                    if (peek_char() == '=') return op_pair('=', op_greater_equal, '>');
-                    return op_pair('>', op_shift_right, '>');
-                case '!': return op_pair('=', op_not_equal, '!');
-                case '&': return op_pair('&', op_and_and, '&');
-                case '.': return op_pair('.', op_dot_dot, '.');
-                case '/': return op_pair('=', op_slash_equal, '/');
-                case '^': return op_pair('^', op_xor_xor, '^');
-                case '|': return op_pair('|', op_or_or, '|');
-                case '%': case '(': case ')': case '*': case '+': case ',':
-                case ':': case ';': case '=': case '[': case ']': case '{':
-                case '}': case '~':
-                    return op(c);
-                default:
-                    return TPLEX_BAD_CHARACTER;
-            }
+                }
+                return op_pair('=', op_slash_equal, '/');
+            case cl_star:
+                if (peek_char() == '/') {
+                    read_char();
+                    return TPLEX_BAD_CHARACTER;  // a "*/" outside a comment
+                }
+                return op('*');
+            case cl_pair:
+                return op_pair(pairs[c].second, pairs[c].value, c);
+            case cl_single:
+                return op(c);
+            default:
+                return TPLEX_BAD_CHARACTER;
         }
-        if (result != keep_scanning) return result;
     }
 }
 
@@ -416,8 +513,31 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token(bool expand) { return scan<false>(expand); }
+status_code scan_token() { return scan<false>(true); }
 
-status_code scan_token_past_line_ends(bool expand) { return scan<true>(expand); }
+// The filter between the scanner and the parser, here so the scan inlines
+// into it: hash words are executed, ends of line dropped (the scan passes
+// over them itself), the end of input delivered whatever the region, and
+// every other result delivered in a live region and dropped in a dead one.
+status_code next_token_filtered() {
+    status_code r;
+    for (;;) {
+        // A dead region drops its tokens, so its names are not expanded:
+        // bodies that name bodies several times over would keep this one
+        // call busy for ever (four names 20 deep are 4^20 bodies).
+        r = scan<true>(region_live());
+        if (r == tk_hash_word) {
+            const status_code d = process_hash_directive();
+            if (d < 0) {
+                r = d;
+                break;
+            }
+            continue;
+        }
+        if (r == tk_end_of_input || (r != tk_end_of_line && region_live())) break;
+    }
+    char_source_store();  // the frame's read_pos is true whenever the parser looks
+    return r;
+}
 
 }  // namespace tplex

@@ -10,14 +10,8 @@ namespace tplex {
 
 // Scans the next token. Its kind (>= 0), tk_end_of_line for an end of line
 // or of a macro body (the record untouched), or a failure code. Honours
-// push_back_flag: returns the current kind again without reading. With
-// expand false, a name defined with a body is returned as a tk_macro token
-// instead of being replaced by its body.
-status_code scan_token(bool expand = true);
-
-// scan_token, but an end of line or of a macro body is passed over instead
-// of returned (a word of a kind that reads as one still comes back).
-status_code scan_token_past_line_ends(bool expand = true);
+// push_back_flag: returns the current kind again without reading.
+status_code scan_token();
 
 // Adds c as the next digit of *number in base: 0, or TPLEX_BAD_DIGIT when c
 // is no digit of the base. Wraps at 32 bits.

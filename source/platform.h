@@ -17,7 +17,8 @@ std::FILE *open_source(const char *path);
 int close_source(std::FILE *file);
 // Reads the next line into line: at most capacity - 1 characters after
 // translation, stopping after a line feed (which is kept), NUL-terminated.
-// False when no character could be read (end of file or a read error).
+// False when no character could be read (end of file or a read error); the
+// line is then left as it was.
 // A null file reads as an empty file.
 bool read_line(std::FILE *file, char *line, std::size_t capacity);
 

@@ -1,7 +1,9 @@
 // The platform layer on a POSIX host: Windows text-mode reading emulated
 // over large blocks.
 //
-// Each stream opened here has a slot with a 64 KiB block of raw bytes. A
+// Each stream opened here has a slot with a 32 KiB block of raw bytes (a
+// nested include costs that much memory, and no more is needed to read at
+// full speed). A
 // line is copied out of the block in runs (memchr finds the line feed,
 // memcpy moves the run); carriage returns and the 0x1A end mark are found
 // with memchr as well, once per block and once after each carriage return,
@@ -18,7 +20,7 @@ namespace tplex::platform {
 
 namespace {
 
-constexpr std::size_t read_block_size = 64 * 1024;
+constexpr std::size_t read_block_size = std::size_t{32} * 1024;
 // 19 files can be open on the source stack at once; the rest is headroom
 // for callers that open streams of their own through this layer.
 constexpr int stream_slot_count = 24;
@@ -105,8 +107,9 @@ bool read_line_unbuffered(std::FILE *file, char *line, std::size_t capacity) {
         line[out++] = static_cast<char>(c);
         if (c == '\n') break;
     }
+    if (out == 0) return false;
     line[out] = '\0';
-    return out > 0;
+    return true;
 }
 
 }  // namespace
@@ -150,12 +153,11 @@ int close_source(std::FILE *file) {
     return std::fclose(file) != 0 ? 1 : 0;
 }
 
-// A capacity below 2 has no room for a character: nothing is read (and a
-// capacity of 1 gets an empty text).
+// A capacity below 2 has no room for a character: nothing is read. As with
+// the C library's line reader, a read that gets no character leaves the line
+// as it was.
 bool read_line(std::FILE *file, char *line, std::size_t capacity) {
-    if (line == nullptr || capacity == 0) return false;
-    line[0] = '\0';
-    if (file == nullptr || capacity == 1) return false;
+    if (line == nullptr || capacity < 2 || file == nullptr) return false;
     stream_state *s = find_slot(file);
     if (s == nullptr) return read_line_unbuffered(file, line, capacity);
 
@@ -197,8 +199,9 @@ bool read_line(std::FILE *file, char *line, std::size_t capacity) {
         }
         find_next_cr(*s);
     }
+    if (out == 0) return false;
     line[out] = '\0';
-    return out > 0;
+    return true;
 }
 
 }  // namespace tplex::platform

@@ -16,12 +16,10 @@ int close_source(std::FILE *file) {
     return std::fclose(file) != 0 ? 1 : 0;
 }
 
-// A capacity below 2 has no room for a character: nothing is read (and a
-// capacity of 1 gets an empty text), as on a POSIX host.
+// A capacity below 2 has no room for a character: nothing is read, as on a
+// POSIX host. A read that gets nothing leaves the line as it was.
 bool read_line(std::FILE *file, char *line, std::size_t capacity) {
-    if (line == nullptr || capacity == 0) return false;
-    line[0] = '\0';
-    if (file == nullptr || capacity == 1) return false;
+    if (line == nullptr || capacity < 2 || file == nullptr) return false;
     const int size = capacity > INT_MAX ? INT_MAX : static_cast<int>(capacity);
     return std::fgets(line, size, file) != nullptr;
 }

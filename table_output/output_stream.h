@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <cstdio>
 
+#include "lex/compiler.h"
 #include "tplex/table_output.h"
 
 namespace tplex {
@@ -54,10 +55,7 @@ void set_output_switches(std::uint32_t flags);
 void begin_stream();
 // Prints a failure message on standard error when diagnostics are on.
 void report(const char *format, ...)
-#if defined(__GNUC__)
-    __attribute__((format(printf, 1, 2)))
-#endif
-    ;
+    TPLEX_PRINTF_FORMAT(1, 2);
 // Closes the table file, if still open; later bytes then fail to reach it.
 void close_output_file();
 // Closes the file, reports the write failure, returns TPLEX_OUT_WRITE_FAILED.

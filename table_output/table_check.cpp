@@ -4,6 +4,7 @@
 #include <cstdarg>
 #include <cstring>
 
+#include "lex/compiler.h"
 #include "lex/memory.h"
 #include "table_output/references.h"
 
@@ -19,10 +20,7 @@ std::uint32_t word_at(const std::uint8_t *p) {
 }
 
 bool failed(TableCheck &check, const char *format, ...)
-#if defined(__GNUC__)
-    __attribute__((format(printf, 2, 3)))
-#endif
-    ;
+    TPLEX_PRINTF_FORMAT(2, 3);
 
 bool failed(TableCheck &check, const char *format, ...) {
     va_list args;

@@ -1,11 +1,14 @@
 #!/usr/bin/env bash
 # Runs the whole test suite: installs what it needs (Debian), then builds and
-# tests the library twice, once plainly and once under AddressSanitizer and
-# UndefinedBehaviorSanitizer, warnings as errors.
+# tests the library three times, once plainly, once under AddressSanitizer and
+# UndefinedBehaviorSanitizer, and once cross-built for 32-bit Windows and run
+# under Wine; warnings as errors. Then it runs each fuzz target (fuzz/run.sh)
+# for a minute, with clang.
 #
 #   tests/run.sh            everything
 #   tests/run.sh plain      only the plain build
 #   tests/run.sh sanitize   only the sanitizer build
+#   tests/run.sh windows    only the Windows build (tplex.dll, under Wine)
 #   tests/run.sh fuzz       only the fuzz targets, each for TPLEX_FUZZ_SECONDS
 #                           (default 60) with clang, failing on any finding
 set -euo pipefail
@@ -37,6 +40,28 @@ build_and_test() {  # name, extra cmake options...
     (cd "$dir" && ctest --output-on-failure -j "$jobs")
 }
 
+# The Windows build: the i686 MinGW-w64 cross compiler, GoogleTest's sources
+# to build along, and 32-bit Wine to run the programs in a prefix of its own.
+windows_build_and_test() {
+    if ! dpkg --print-foreign-architectures | grep -qx i386; then
+        echo "== adding the i386 architecture (for 32-bit Wine)"
+        dpkg --add-architecture i386
+    fi
+    need_packages g++-mingw-w64-i686 googletest wine wine32:i386
+    export WINEPREFIX=${TPLEX_WINEPREFIX:-/tmp/tplex-wine-$(id -u)}
+    export WINEARCH=win32 WINEDEBUG=-all WINEDLLOVERRIDES="mscoree,mshtml="
+    [ -f "$WINEPREFIX/system.reg" ] || echo "== creating the Wine prefix $WINEPREFIX"
+    # One Wine server for every test program, stopped however this ends. Its
+    # services start here, away from ctest: they live as long as the server
+    # and would hold a test's output pipe open, so ctest would never finish.
+    wineserver -p </dev/null >/dev/null 2>&1 || true
+    trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
+    wineboot </dev/null >/dev/null 2>&1
+    build_and_test windows -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64-i686.cmake"
+    wineserver -k >/dev/null 2>&1 || true
+    trap - EXIT
+}
+
 fuzz_targets() {
     need_packages clang libclang-rt-14-dev
     bash "$root/fuzz/run.sh" "${TPLEX_FUZZ_SECONDS:-60}"
@@ -48,12 +73,14 @@ what=${1:-all}
 case "$what" in
     plain)    build_and_test plain ;;
     sanitize) build_and_test sanitize -DTPLEX_SANITIZE=ON ;;
+    windows)  windows_build_and_test ;;
     fuzz)     fuzz_targets ;;
     all)
         build_and_test plain
         build_and_test sanitize -DTPLEX_SANITIZE=ON
+        windows_build_and_test
         fuzz_targets
         ;;
-    *) echo "usage: tests/run.sh [all|plain|sanitize|fuzz]" >&2; exit 2 ;;
+    *) echo "usage: tests/run.sh [all|plain|sanitize|windows|fuzz]" >&2; exit 2 ;;
 esac
 echo "== all tests passed"

@@ -51,7 +51,7 @@ TEST_F(Lexer, KeywordsAreLoadedWithTheirKindsAndCodes) {
 }
 
 TEST_F(Lexer, ReservedWordTableHasTheParserVisibleLayout) {
-    const auto *bytes = reinterpret_cast<const unsigned char *>(reserved_word_table);
+    const auto *bytes = reinterpret_cast<const unsigned char *>(reserved_word_table.data());
     for (int code : {0, 39, 93, 117}) {
         const unsigned char *record = bytes + code * 2502;
         EXPECT_EQ(record[0] | (record[1] << 8), code);
@@ -161,7 +161,7 @@ TEST(LexerLifecycle, SetupWritesOnlyThroughNonNullPointers) {
     EXPECT_EQ(sc_lex_setup(nullptr, &frames, &depth, &words, &declare), 0);
     EXPECT_EQ(frames, source_stack);
     EXPECT_EQ(depth, &source_depth);
-    EXPECT_EQ(words, reserved_word_table);
+    EXPECT_EQ(words, reserved_word_table.data());
     EXPECT_EQ(declare, &declare_enabled);
     ::lex_free();
 }

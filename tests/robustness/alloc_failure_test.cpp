@@ -241,8 +241,10 @@ TEST(AllocFailure, DictExtend) {
 // make_label: "Malloc Failed" and no label; declaring it again works.
 
 TEST(AllocFailure, MakeLabel) {
+    TempDir dir;
+    const std::string empty = dir.write("empty.src", "");
     int32_t r = 0;
-    walk_failures([] { start_pass("/dev/null"); }, [&] { r = tplex::make_label(42, 7, 1); },
+    walk_failures([&] { start_pass(empty); }, [&] { r = tplex::make_label(42, 7, 1); },
                   [&](unsigned long) {
                       EXPECT_EQ(r, TPLEX_MALLOC_FAILED);
                       EXPECT_EQ(tplex::make_label(42, 7, 0), TPLEX_DISASTER);
@@ -256,8 +258,10 @@ TEST(AllocFailure, MakeLabel) {
 // names before it stay defined, the failed one and those after it are not.
 
 TEST(AllocFailure, InitDefines) {
+    TempDir dir;
+    const std::string empty = dir.write("empty.src", "");
     int32_t r = 0;
-    walk_failures([] { start_pass("/dev/null"); },
+    walk_failures([&] { start_pass(empty); },
                   [&] {
                       char a[] = "one", b[] = "two", c[] = "three";
                       char *names[] = {a, b, c};

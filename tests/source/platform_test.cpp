@@ -1,5 +1,5 @@
 // Text-mode reading on the host: CR LF, 0x1A, the line limit, and the
-// boundaries of the 64 KiB blocks that the reader works in.
+// boundaries of the 32 KiB blocks that the reader works in.
 #include "source/platform.h"
 
 #include <gtest/gtest.h>
@@ -16,7 +16,7 @@ namespace tplex {
 namespace {
 
 using Lines = std::vector<std::string>;
-constexpr std::size_t block = 64 * 1024;
+constexpr std::size_t block = 32 * 1024;
 
 // Reads every line of a stream; a line's length is found from a filler byte
 // written behind it, so NUL bytes inside a line count as well.
@@ -132,6 +132,9 @@ TEST(TextMode, RandomFilesAgreeWithCharacterAtATime) {
 }
 
 TEST(TextMode, StreamsNotOpenedHereReadTheSame) {
+#ifndef _WIN32
+    // On Windows text mode belongs to the C runtime and is chosen when a file
+    // is opened: a stream opened in binary mode reads its bytes unchanged.
     test::TempDir tmp;
     std::FILE *file = std::fopen(tmp.write("f",
                                            "a\r\nb\rc\x1A"
@@ -140,9 +143,10 @@ TEST(TextMode, StreamsNotOpenedHereReadTheSame) {
                                  "rb");
     EXPECT_EQ(read_all(file, 5000), (Lines{"a\n", "b\rc"}));
     std::fclose(file);
+#endif
     char line[8] = "x";
     EXPECT_FALSE(platform::read_line(nullptr, line, sizeof line));
-    EXPECT_STREQ(line, "");
+    EXPECT_STREQ(line, "x") << "a read that gets nothing leaves the line as it was";
 }
 
 TEST(PlatformOpen, PathsAndSlots) {
@@ -155,7 +159,10 @@ TEST(PlatformOpen, PathsAndSlots) {
     EXPECT_EQ(platform::open_source(tmp.path().c_str()), nullptr);  // a directory
     EXPECT_EQ(platform::open_source((tmp.path() + "/" + std::string(2500, 'p')).c_str()), nullptr);
 
+#ifndef _WIN32
     // Every slot taken: the next open fails, and works again once one is free.
+    // (The POSIX layer's own read slots; on Windows the C runtime's limit on
+    // open streams applies instead.)
     std::vector<std::FILE *> open;
     const std::string path = tmp.path() + "/d/f.src";
     while (std::FILE *f = platform::open_source(path.c_str())) open.push_back(f);
@@ -164,6 +171,7 @@ TEST(PlatformOpen, PathsAndSlots) {
     open.back() = platform::open_source(path.c_str());
     EXPECT_NE(open.back(), nullptr);
     for (std::FILE *f : open) EXPECT_EQ(platform::close_source(f), 0);
+#endif
 
     // A stream closed behind the layer's back: a new stream at its address
     // reads its own bytes.

@@ -6,6 +6,14 @@
 
 namespace tplex::test {
 
+// The line break that the host's text mode writes ("w" and "w+"): CR LF on
+// Windows, LF on a POSIX host. Reading in text mode gives LF on both.
+#ifdef _WIN32
+inline constexpr const char host_line_end[] = "\r\n";
+#else
+inline constexpr const char host_line_end[] = "\n";
+#endif
+
 // A fresh folder under the system's temporary directory, removed with
 // everything in it when the object goes.
 class TempDir {

@@ -78,12 +78,15 @@ TEST_F(StreamTest, HexTextMatchesRawBytes) {
     for (std::size_t i = 0; i < raw.size(); ++i) {
         char item[8];
         std::snprintf(item, sizeof item, " 0x%02x", raw[i]);
-        expected += (i == 0 ? "" : i % 16 == 0 ? ",\n" : ",") + std::string(item);
+        // The line break is the host's text mode's: CR LF on Windows.
+        expected += (i == 0 ? "" : i % 16 == 0 ? "," + std::string(host_line_end) : ",") +
+                    std::string(item);
     }
     EXPECT_EQ(text, expected);
     // Tag, length 56, R 48; the 17th byte starts line 2.
     EXPECT_EQ(text.substr(0, 53), " 0x78, 0x56, 0x34, 0x12, 0x38, 0x00, 0x00, 0x00, 0x30");
-    EXPECT_EQ(text.substr(95, 7), ",\n 0xa0");
+    EXPECT_EQ(text.substr(95, 6 + sizeof host_line_end - 1),
+              "," + std::string(host_line_end) + " 0xa0");
 }
 
 TEST_F(StreamTest, MemoryOutputIsAStreamOfItsOwn) {

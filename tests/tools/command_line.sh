@@ -53,7 +53,17 @@ expect 2 "unknown option '-I'" table -I include x.tbl
 # Files and names the lexer refuses.
 expect 2 '^tplex: cannot open nowhere.tpl: No Includes to Search for Included File$' \
     check nowhere.tpl
-expect 2 '^tplex: cannot open /nowhere/x.tpl: Cannot Open Source File$' check /nowhere/x.tpl
+# A missing file under an absolute name. A name that begins with "/" is
+# absolute on a POSIX host only; on Windows it is relative, and a drive path
+# is absolute.
+if [ "${TPLEX_TARGET_SYSTEM:-}" = Windows ]; then
+    expect 2 '^tplex: cannot open C:\\nowhere\\x\.tpl: Cannot Open Source File$' \
+        check 'C:\nowhere\x.tpl'
+    expect 2 '^tplex: cannot open /nowhere/x.tpl: No Includes to Search for Included File$' \
+        check /nowhere/x.tpl
+else
+    expect 2 '^tplex: cannot open /nowhere/x.tpl: Cannot Open Source File$' check /nowhere/x.tpl
+fi
 expect 2 '^tplex: -D protocol: the name is already known' check -D protocol signalling.tpl
 expect 2 '^tplex: -D x: the name is already known' check -D X -D x signalling.tpl
 expect 2 '^tplex: -I include: Attempting too many Includes$' \

@@ -1,0 +1,118 @@
+#!/usr/bin/env bash
+# Checks the binary interface of tplex.dll from its headers and code:
+#   - the export table holds exactly the sixteen names, undecorated;
+#   - it imports nothing but Windows' own DLLs (no MinGW runtime DLLs), and
+#     neither do the programs named after it (the tool);
+#   - each exported function is caller-cleans (__cdecl): a callee-cleans
+#     function ends in "ret $n" and carries an "@n" suffix in its symbol;
+#   - loading it runs no code of the library's own: its constructor list
+#     holds nothing but the runtime's registration of unwind tables.
+#
+#   check_dll.sh OBJDUMP DLL [PROGRAM...]
+set -euo pipefail
+objdump=$1
+dll=$2
+shift 2
+
+expected="back_token
+dict_check
+dict_extend
+lex_free
+lex_initialise
+open_source_file
+parse_ident
+rewind_input
+sc_lex_init
+sc_lex_init_defines
+sc_lex_init_file
+sc_lex_setup
+sc_next_token
+sg_DisplayError
+sg_GetError
+sg_closesources"
+allowed_imports="kernel32.dll msvcrt.dll"
+
+failed=0
+fail() { echo "FAIL: $*"; failed=1; }
+
+headers=$("$objdump" -p "$dll")
+
+# "[Ordinal/Name Pointer] Table" lists the exported names, one a line.
+names=$(awk '/^\[Ordinal\/Name Pointer\] Table/ { on = 1; next }
+             on && /^[[:space:]]*\[ *[0-9]+\]/ { print $NF; next }
+             on { on = 0 }' <<<"$headers" | LC_ALL=C sort)
+if [ "$names" != "$(LC_ALL=C sort <<<"$expected")" ]; then
+    fail "export names differ from the sixteen:"
+    diff <(LC_ALL=C sort <<<"$expected") <(echo "$names") | sed 's/^/    /' || true
+fi
+
+# Every exported address has a name: no exports by ordinal only.
+addresses=$(grep -c 'Export RVA' <<<"$headers" || true)
+[ "$addresses" = 16 ] || fail "export address table has $addresses entries, not 16"
+
+imports_of() { awk '/DLL Name:/ { print tolower($3) }' | sort -u; }
+check_imports() {  # file, its imports
+    for dll_name in $2; do
+        case " $allowed_imports " in
+            *" $dll_name "*) ;;
+            *) fail "$(basename "$1") imports $dll_name" ;;
+        esac
+    done
+}
+imports=$(imports_of <<<"$headers")
+check_imports "$dll" "$imports"
+for program in "$@"; do
+    check_imports "$program" "$("$objdump" -p "$program" | imports_of)"
+done
+
+# The code of each export, up to the next symbol.
+code=$("$objdump" -d --no-show-raw-insn "$dll")
+for name in $expected; do
+    body=$(awk -v label="<_${name}>:" '$2 == label { on = 1; next }
+                                       on && /^[0-9a-f]+ <.*>:$/ { exit }
+                                       on { print }' <<<"$code")
+    if [ -z "$body" ]; then
+        fail "no code under the symbol _$name (decorated, or the DLL stripped?)"
+    elif grep -Eq '[[:space:]]ret[lw]?[[:space:]]+\$' <<<"$body"; then
+        fail "$name removes its own arguments (ret \$n): not __cdecl"
+    fi
+done
+
+# The constructor list: all ones, the constructors' addresses, zero.
+symbols=$("$objdump" -t "$dll")
+symbol_field() {  # name, field: "sec" number or "value"
+    awk -v name="$1" -v field="$2" '$NF == name {
+        if (field == "sec") { match($0, /\(sec +[0-9]+\)/); s = substr($0, RSTART + 4, RLENGTH - 5); print s + 0 }
+        else print $(NF - 1)
+        exit }' <<<"$symbols"
+}
+list=$(symbol_field ___CTOR_LIST__ value)
+list_end=$(symbol_field ___DTOR_LIST__ value)
+section=$(symbol_field ___CTOR_LIST__ sec)
+if [ -z "$list" ] || [ -z "$list_end" ]; then
+    fail "no constructor list found (the DLL stripped?)"
+else
+    section_name=$("$objdump" -h "$dll" | awk -v n=$((section - 1)) '$1 == n { print $2 }')
+    vma=$("$objdump" -h "$dll" | awk -v n=$((section - 1)) '$1 == n { print $4 }')
+    words=$("$objdump" -s -j "$section_name" --start-address=$((0x$vma + list)) \
+        --stop-address=$((0x$vma + list_end)) "$dll" |
+        awk '/^ [0-9a-f]+ / { for (i = 2; i <= 5 && length($i) == 8 && $i ~ /^[0-9a-f]+$/; ++i) print $i }')
+    for word in $words; do
+        # Little-endian: the bytes as printed, reversed.
+        address=$((0x${word:6:2}${word:4:2}${word:2:2}${word:0:2}))
+        [ "$address" = $((0xffffffff)) ] || [ "$address" = 0 ] && continue
+        offset=$(printf '0x%08x' $((address - 0x$vma)))
+        name=$(awk -v sec="$(printf '(sec %2d)' "$section")" -v value="$offset" \
+            'index($0, sec) && $(NF - 1) == value && $0 ~ /\(ty +20\)/ { print $NF; exit }' <<<"$symbols")
+        case "$name" in
+            _register_frame_ctor) ;;
+            *) fail "loading the DLL runs ${name:-the code at $offset}" ;;
+        esac
+    done
+fi
+
+if [ "$failed" -ne 0 ]; then
+    echo "tplex.dll: binary interface check failed"
+    exit 1
+fi
+echo "tplex.dll: 16 undecorated __cdecl exports; it and $# program(s) import only: $allowed_imports"
