@@ -60,7 +60,6 @@ constexpr std::array<char, 256> make_ident_upper() {
 constexpr std::array<char, 256> ident_upper = make_ident_upper();
 #endif
 
-inline bool is_letter(std::uint8_t c) { return (classes[c] & cc_letter) != 0; }
 inline bool is_digit(std::uint8_t c) { return (classes[c] & cc_digit) != 0; }
 inline bool is_hex(std::uint8_t c) { return (classes[c] & cc_hex) != 0; }
 inline bool is_ident(std::uint8_t c) { return (classes[c] & cc_ident) != 0; }
