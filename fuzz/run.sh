@@ -2,7 +2,9 @@
 # Builds the libFuzzer targets with clang (AddressSanitizer and
 # UndefinedBehaviorSanitizer, LeakSanitizer on) and runs each for a bounded
 # time, two at a time, from its seed corpus. Fails on any finding: a crash,
-# a broken invariant, a leak, a timeout or running out of memory.
+# a broken invariant, a leak, a timeout or running out of memory. (Warnings
+# are not errors here: the gcc builds of tests/run.sh hold that line, and a
+# clang-only warning is no finding.)
 #
 #   fuzz/run.sh [SECONDS [TARGET...]]     default: 60 seconds, every target
 #
@@ -33,7 +35,7 @@ targets=("$@")
 echo "== fuzz build"
 cmake -S "$root" -B "$build" -DCMAKE_BUILD_TYPE=RelWithDebInfo \
     -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++ \
-    -DTPLEX_FUZZ=ON -DTPLEX_ALLOC_HOOK=ON -DTPLEX_WERROR=ON \
+    -DTPLEX_FUZZ=ON -DTPLEX_ALLOC_HOOK=ON \
     -DTPLEX_BUILD_TESTS=OFF -DTPLEX_BUILD_TOOLS=OFF >/dev/null
 cmake --build "$build" -j "$(nproc 2>/dev/null || echo 2)"
 
