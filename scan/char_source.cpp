@@ -84,6 +84,11 @@ void char_source_sync() {
 
 void char_source_forget() { drop_cursor(); }
 
+void drop_macros() {
+    char_source_sync();
+    macro_depth = 0;
+}
+
 std::uint8_t read_char_slow() {
     // The common case first: the file line being read has ended (a valid
     // file cursor means no body is pending and its frame is the current

@@ -89,6 +89,9 @@ status_code push_macro(const char *body);
 // source: store the read position into its frame and derive it again from
 // the stacks on the next read.
 void char_source_sync();
+// Abandons every pending body: reading goes on in the current file.
+void drop_macros();
+
 // Stores the read position into its source frame; the cursor stays where
 // it is. (A macro frame's position is internal and stored when needed.)
 inline void char_source_store() {

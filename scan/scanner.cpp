@@ -112,13 +112,12 @@ TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     return n;
 }
 
-// A word: looked up, and expanded in place when it names a body (unless
-// expand is false: the name is then a token of kind 4 like any other).
-TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c, bool expand) {
+// A word: looked up, and expanded in place when it names a body.
+TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c) {
     tok.text[0] = upper[c];
     const std::size_t n = take_ident_chars(1);
     if (dict_lookup_token(n) != 1) tok.kind = tk_new_identifier;
-    if (tok.kind == tk_macro && expand) return push_macro(tok.def_text1);  // 0: scan the body
+    if (tok.kind == tk_macro) return push_macro(tok.def_text1);  // 0: scan the body
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
 
@@ -414,7 +413,7 @@ inline void skip_blanks() {
 // One scan. The filter drops every end of line, so it asks for them to be
 // skipped here rather than returned one by one.
 template <bool skip_line_ends>
-TPLEX_HOT_INLINE status_code scan(bool expand) {
+TPLEX_HOT_INLINE status_code scan() {
     if (push_back_flag == 1) {
         push_back_flag = 0;
         return tok.kind;
@@ -427,7 +426,7 @@ TPLEX_HOT_INLINE status_code scan(bool expand) {
         status_code result;
         switch (dispatch[c]) {
             case cl_letter:
-                result = scan_word(c, expand);
+                result = scan_word(c);
                 if (result != keep_scanning) return result;
                 continue;  // a name's body is being read, or a word of kind 0
             case cl_digit:
@@ -512,7 +511,14 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token() { return scan<false>(true); }
+status_code scan_token() { return scan<false>(); }
+
+// Dropping is not free. In a switched-off region, bodies that name bodies
+// several times over can keep one call dropping tokens for ever (four names
+// 20 deep are 4^20 bodies). Past this many tokens dropped from bodies in one
+// call, no real source is concerned: the pending bodies are abandoned and the
+// call reports the nesting failure, so it always returns.
+constexpr unsigned long max_dropped_from_bodies = 1ul << 22;
 
 // The filter between the scanner and the parser, here so the scan inlines
 // into it: hash words are executed, ends of line dropped (the scan passes
@@ -520,11 +526,9 @@ status_code scan_token() { return scan<false>(true); }
 // every other result delivered in a live region and dropped in a dead one.
 status_code next_token_filtered() {
     status_code r;
+    unsigned long dropped_from_bodies = 0;
     for (;;) {
-        // A dead region drops its tokens, so its names are not expanded:
-        // bodies that name bodies several times over would keep this one
-        // call busy for ever (four names 20 deep are 4^20 bodies).
-        r = scan<true>(region_live());
+        r = scan<true>();
         if (r == tk_hash_word) {
             const status_code d = process_hash_directive();
             if (d < 0) {
@@ -534,6 +538,11 @@ status_code next_token_filtered() {
             continue;
         }
         if (r == tk_end_of_input || (r != tk_end_of_line && region_live())) break;
+        if (macro_depth > 0 && ++dropped_from_bodies > max_dropped_from_bodies) {
+            drop_macros();
+            r = TPLEX_TOO_MANY_MACRO_LEVELS;
+            break;
+        }
     }
     char_source_store();  // the frame's read_pos is true whenever the parser looks
     return r;
