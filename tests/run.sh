@@ -3,9 +3,11 @@
 # tests the library three times, once plainly, once under AddressSanitizer and
 # UndefinedBehaviorSanitizer, and once cross-built for 32-bit Windows and run
 # under Wine; warnings as errors. Then it runs each fuzz target (fuzz/run.sh)
-# for a minute, with clang.
+# for a minute, with clang. First of all, the sources must be formatted
+# (.clang-format) and clean under .clang-tidy.
 #
 #   tests/run.sh            everything
+#   tests/run.sh lint       only the format and lint checks
 #   tests/run.sh plain      only the plain build
 #   tests/run.sh sanitize   only the sanitizer build
 #   tests/run.sh windows    only the Windows build (tplex.dll, under Wine)
@@ -62,6 +64,19 @@ windows_build_and_test() {
     trap - EXIT
 }
 
+# Every C and C++ source as .clang-format lays it out; the library and the
+# tool clean under .clang-tidy's checks.
+lint() {
+    need_packages clang-format clang-tidy
+    echo "== lint"
+    git -C "$root" ls-files '*.c' '*.cpp' '*.h' | (cd "$root" && xargs clang-format --dry-run -Werror)
+    local dir="$root/build-tests/lint"
+    cmake -S "$root" -B "$dir" -DCMAKE_EXPORT_COMPILE_COMMANDS=ON -DTPLEX_BUILD_TESTS=OFF >/dev/null
+    (cd "$root" && git ls-files 'lex/*.cpp' 'dict/*.cpp' 'scan/*.cpp' 'source/*.cpp' 'errors/*.cpp' \
+        'table_output/*.cpp' 'tools/*.cpp' | grep -v platform_windows |
+        xargs clang-tidy -p "$dir" --quiet)
+}
+
 fuzz_targets() {
     need_packages clang libclang-rt-14-dev
     bash "$root/fuzz/run.sh" "${TPLEX_FUZZ_SECONDS:-60}"
@@ -71,16 +86,18 @@ need_packages cmake g++ make libgtest-dev pkg-config file
 
 what=${1:-all}
 case "$what" in
+    lint)     lint ;;
     plain)    build_and_test plain ;;
     sanitize) build_and_test sanitize -DTPLEX_SANITIZE=ON ;;
     windows)  windows_build_and_test ;;
     fuzz)     fuzz_targets ;;
     all)
+        lint
         build_and_test plain
         build_and_test sanitize -DTPLEX_SANITIZE=ON
         windows_build_and_test
         fuzz_targets
         ;;
-    *) echo "usage: tests/run.sh [all|plain|sanitize|windows|fuzz]" >&2; exit 2 ;;
+    *) echo "usage: tests/run.sh [all|lint|plain|sanitize|windows|fuzz]" >&2; exit 2 ;;
 esac
 echo "== all tests passed"
