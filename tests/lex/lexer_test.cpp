@@ -8,7 +8,6 @@
 #include "dict/dictionary.h"
 #include "lex/keywords.h"
 #include "lex/lexer.h"
-#include "lex/memory.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
 #include "source/source_stack.h"
@@ -84,16 +83,6 @@ TEST(Lexer, ExportsAreSafeWithoutState) {
     EXPECT_EQ(::sg_closesources(), 0);
     EXPECT_EQ(::open_source_file("x"), TPLEX_NOT_INITIALISED);
     EXPECT_EQ(::rewind_input(), TPLEX_NOT_INITIALISED);
-#ifdef TPLEX_ALLOC_HOOK
-    for (unsigned long n = 1; n <= 3; ++n) {  // a failed initialisation keeps nothing
-        mem_fail_at(n);
-        EXPECT_EQ(sc_lex_init(), TPLEX_MALLOC_FAILED) << n;
-        mem_fail_at(0);
-        EXPECT_EQ(dict_slots, nullptr);
-        EXPECT_EQ(macro_stack, nullptr);
-        EXPECT_EQ(source_stack, nullptr);
-    }
-#endif
 }
 
 }  // namespace

@@ -10,7 +10,6 @@
 
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
-#include "lex/memory.h"
 #include "lex_harness.h"
 #include "scan/directives.h"
 #include "scan/string_arg.h"
@@ -98,15 +97,6 @@ TEST(ScannerLimits, DefineBodyLengths) {
     EXPECT_EQ(lex("#define S \"" + rep('s', 2497) + "\"\nS"), (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:S", "eof"}));
     EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2498) + "\">\n", "P"), "4:0|" + rep('p', 2498) + " ");
     EXPECT_EQ(lex("#define P <\"" + rep('p', 2499) + "\">\nP"), (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:P", "eof"}));
-}
-
-TEST(ScannerLimits, DefineWithoutMemoryForTheNameCopy) {
-    LexSession s;
-    ASSERT_EQ(s.open("#define X 1 2\nX"), 1);
-    tplex::mem_fail_at(1);
-    EXPECT_EQ(LexSession::next().result, TPLEX_MALLOC_FAILED);
-    tplex::mem_fail_at(0);
-    EXPECT_EQ(LexSession::all_described(), (Tokens{"n:1:1", "n:2:2", "id:X", "eof"}));
 }
 
 TEST(Include, FilesAndTheLinesAroundThem) {
