@@ -15,11 +15,10 @@
 namespace tplex {
 namespace {
 
-constexpr const char *heading = "\nTemplate compiler error :\n";
-constexpr const char *confused = "Unspecified error. The Parser is now very confused.";
+const std::string heading = "\nTemplate compiler error :\n";
+const std::string confused = "Unspecified error. The Parser is now very confused.";
 
-// A source stack owned by the test, as lex_initialise leaves it, with one
-// file at depth 1: line 12 of main.src.
+// A source stack owned by the test with one file at depth 1: line 12 of main.src.
 class Messages : public ::testing::Test {
 protected:
     Messages() {
@@ -50,79 +49,46 @@ protected:
     static std::string at_main(const std::string &message) {
         return heading + message + "\nFile: main.src    Line: 12\nx = ?;\n";
     }
-    static std::string at_frame0(const std::string &message) {
-        return heading + message + "\nFile:     Line: 0\n";
-    }
-
     std::unique_ptr<source_frame[]> frames_{new source_frame[source_frame_count]};
 };
 
-TEST_F(Messages, DisplayListedCodes) {
+TEST_F(Messages, ListedAndUnlistedCodes) {
     EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_main("Bad Character"));
-    EXPECT_EQ(display(TPLEX_GENERAL_FAILURE), at_main("General Failure Code"));
-    EXPECT_EQ(display(TPLEX_FIELD_NOT_PRESENT),
-              at_main("Not an allowed field not present statement"));
-    EXPECT_EQ(display(TPLEX_BAD_HASH_WORD), at_main("Unrecognisd or Invalid Hash Word"));
-    EXPECT_EQ(display(TPLEX_CLOSE_FAILED), std::string(heading) + "Error Closing File\n");
-}
-
-TEST_F(Messages, DisplayUnlistedCodes) {
-    EXPECT_EQ(display(TPLEX_STATUS(0xD3470231u)), at_main("unspecified error: d3470231"));
-    EXPECT_EQ(display(TPLEX_STATUS(0xD3470233u)), at_main("unspecified error: d3470233"));
-    EXPECT_EQ(display(TPLEX_STATUS(0xD3470200u)), at_main("unspecified error: d3470200"));
-    EXPECT_EQ(display(0), at_main("unspecified error: 0"));
-    EXPECT_EQ(display(7), at_main("unspecified error: 7"));
-    EXPECT_EQ(display(TPLEX_OUT_TOO_MANY_REFERENCES), at_main("unspecified error: d347000b"));
-    EXPECT_EQ(display(TPLEX_ALREADY_DEFINED), at_main("unspecified error: d3431001"));
-}
-
-TEST_F(Messages, DisplayPosition) {
-    frames_[1].line_no = 0xFFFFFFFFu;  // opened, no line read yet
-    frames_[1].line_text[0] = '\0';
-    EXPECT_EQ(display(TPLEX_BAD_CHARACTER),
-              heading + std::string("Bad Character\nFile: main.src    Line: 0\n"));
-    source_depth = 0;
-    EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_frame0("Bad Character"));
-    source_depth = 20;
-    EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_frame0("Bad Character"));
-    source_depth = -1;
-    EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_frame0("Bad Character"));
-    source_stack = nullptr;
-    EXPECT_EQ(display(TPLEX_NULL_FILENAME), at_frame0("Null Filename"));
-}
-
-TEST_F(Messages, GetError) {
-    EXPECT_EQ(get(TPLEX_BAD_CHARACTER), "Bad Character");
-    EXPECT_EQ(get(TPLEX_CLOSE_FAILED), "Error Closing File");
-    EXPECT_EQ(get(TPLEX_FIELD_NOT_PRESENT), "Not an allowed field not present statement");
-    for (status_code unlisted :
-         {TPLEX_STATUS(0xD3470231u), TPLEX_STATUS(0xD3470233u), TPLEX_STATUS(0xD3470200u), 0,
-          TPLEX_OUT_TOO_MANY_REFERENCES, TPLEX_MACRO_REDEFINED}) {
-        EXPECT_EQ(get(unlisted), confused);
+    EXPECT_EQ(display(TPLEX_FIELD_NOT_PRESENT), at_main("Not an allowed field not present statement"));
+    EXPECT_EQ(display(TPLEX_CLOSE_FAILED), heading + "Error Closing File\n");
+    EXPECT_EQ(get(TPLEX_GENERAL_FAILURE), "General Failure Code");
+    for (const auto &[code, text] : std::initializer_list<std::pair<status_code, const char *>>{
+             {TPLEX_STATUS(0xD3470231u), "d3470231"}, {TPLEX_STATUS(0xD3470233u), "d3470233"},
+             {TPLEX_STATUS(0xD3470200u), "d3470200"}, {0, "0"}, {7, "7"},
+             {TPLEX_OUT_TOO_MANY_REFERENCES, "d347000b"}, {TPLEX_ALREADY_DEFINED, "d3431001"}}) {
+        EXPECT_EQ(display(code), at_main(std::string("unspecified error: ") + text));
+        EXPECT_EQ(get(code), confused);
     }
-    test::CaptureStdout out;
-    get_error(TPLEX_OK);
-    get_error(TPLEX_BAD_CHARACTER);
-    EXPECT_EQ(out.text(), "\n\nError:   \n\nError:   ");
-}
-
-// Both operations know the same codes: 49 texts, all in 0xD3470201..0xD3470232.
-TEST_F(Messages, BothOperationsKnowTheSameCodes) {
+    // Both operations know the same 49 codes, all in 0xD3470201..0xD3470232.
     int listed = 0;
     for (std::uint32_t c = 0xD34701F0u; c < 0xD3470250u; ++c) {
-        const status_code code = TPLEX_STATUS(c);
-        const std::string text = get(code);
-        if (text == confused) {
-            EXPECT_EQ(status_text(code), nullptr);
-            continue;
-        }
+        const std::string text = get(TPLEX_STATUS(c));
+        if (text == confused) continue;
         ++listed;
         EXPECT_TRUE(c >= 0xD3470201u && c <= 0xD3470232u) << std::hex << c;
-        if (code != TPLEX_CLOSE_FAILED) {
-            EXPECT_EQ(display(code), at_main(text));
+        if (TPLEX_STATUS(c) != TPLEX_CLOSE_FAILED) {
+            EXPECT_EQ(display(TPLEX_STATUS(c)), at_main(text));
         }
     }
     EXPECT_EQ(listed, 49);
+}
+
+TEST_F(Messages, Position) {
+    const std::string at_frame0 = heading + "Bad Character\nFile:     Line: 0\n";
+    frames_[1].line_no = 0xFFFFFFFFu;  // opened, no line read yet
+    frames_[1].line_text[0] = '\0';
+    EXPECT_EQ(display(TPLEX_BAD_CHARACTER), heading + "Bad Character\nFile: main.src    Line: 0\n");
+    for (int16_t depth : {0, 20, -1}) {
+        source_depth = depth;
+        EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_frame0) << depth;
+    }
+    source_stack = nullptr;
+    EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_frame0);
 }
 
 // The position of a file read through the lexer: CR LF arrives as LF.
@@ -132,13 +98,10 @@ TEST(MessagesOverTheLexer, ShowTheLineBeingRead) {
     tmp.write("a.src", "one\r\ntwo\r\n");
     ASSERT_EQ(lex_initialise(), TPLEX_OK);
     ASSERT_EQ(open_source_file("a.src"), 1);
-    test::CaptureStdout before;
-    display_error(TPLEX_BAD_CHARACTER);
-    EXPECT_EQ(before.text(), heading + std::string("Bad Character\nFile: a.src    Line: 0\n"));
     for (const char *expected = "one\nt"; *expected; ++expected) EXPECT_EQ(read_char(), *expected);
-    test::CaptureStdout after;
+    test::CaptureStdout out;
     display_error(TPLEX_BAD_CHARACTER);
-    EXPECT_EQ(after.text(), heading + std::string("Bad Character\nFile: a.src    Line: 2\ntwo\n"));
+    EXPECT_EQ(out.text(), heading + "Bad Character\nFile: a.src    Line: 2\ntwo\n");
     close_sources();
     lex_free();
 }

@@ -27,12 +27,6 @@ std::string describe(const Token &t) {
     }
 }
 
-Token snapshot(status_code result) {
-    token_record *tok = nullptr;
-    sc_lex_setup(&tok, nullptr, nullptr, nullptr, nullptr);
-    return Token{result, tok->kind, tok->value, std::string(tok->text)};
-}
-
 LexSession::LexSession() { sc_lex_init(); }
 
 LexSession::~LexSession() {
@@ -40,35 +34,23 @@ LexSession::~LexSession() {
     lex_free();
 }
 
-std::string LexSession::file(const std::string &name, const std::string &bytes) const {
-    return dir_.write(name, bytes);
+Token LexSession::next() {
+    const status_code r = sc_next_token();
+    token_record *tok = nullptr;
+    sc_lex_setup(&tok, nullptr, nullptr, nullptr, nullptr);
+    return Token{r, tok->kind, tok->value, std::string(tok->text)};
 }
 
-status_code LexSession::open(const std::string &bytes, const std::string &name) const {
-    return sc_lex_init_file(file(name, bytes).c_str());
-}
-
-Token LexSession::next() { return snapshot(sc_next_token()); }
-
-std::vector<Token> LexSession::all(std::size_t limit) {
+std::vector<Token> LexSession::all() {
     std::vector<Token> out;
-    for (std::size_t i = 0; i < limit; ++i) {
-        out.push_back(next());
-        if (out.back().result == tk_end_of_input) break;
-    }
+    while (out.size() < 20000 && (out.empty() || out.back().result != tk_end_of_input)) out.push_back(next());
     return out;
 }
 
-Tokens LexSession::all_described(std::size_t limit) {
+Tokens LexSession::all_described() {
     Tokens out;
-    for (const Token &t : all(limit)) out.push_back(describe(t));
+    for (const Token &t : all()) out.push_back(describe(t));
     return out;
-}
-
-Tokens lex(const std::string &text) {
-    LexSession s;
-    if (s.open(text) != 1) return {"open failed"};
-    return LexSession::all_described();
 }
 
 Tokens lex_with_defines(const std::string &text, std::vector<std::string> names) {
@@ -80,5 +62,7 @@ Tokens lex_with_defines(const std::string &text, std::vector<std::string> names)
     if (s.open(text) != 1) return {"open failed"};
     return LexSession::all_described();
 }
+
+Tokens lex(const std::string &text) { return lex_with_defines(text, {}); }
 
 }  // namespace tplex::test

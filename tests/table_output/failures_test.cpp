@@ -154,47 +154,5 @@ TEST_F(FailureTest, SeekFailureIsAlwaysPrintedOnStandardOutput) {
 #endif
 }
 
-#ifdef TPLEX_ALLOC_HOOK
-// Allocation n of `run` fails.
-Action failing(unsigned long n, const Action &run) {
-    return [n, run] {
-        mem_fail_at(n);
-        status_code s = run();
-        mem_fail_at(0);
-        return s;
-    };
-}
-
-TEST_F(FailureTest, AllocationFailures) {
-    expect_failure(failing(1, [] { return WriteReference(nullptr, 0); }), TPLEX_OUT_NO_MEMORY_RELOC,
-                   "sg_TableOutput (CreateReference): Failed to malloc reloc record\n", true);
-    auto second_chunk = [] {  // 9 bytes left; allocation 1 is the use's record
-        AddToStringStore(nullptr, std::string(9990, 'x').c_str());
-        return failing(2, [] { return StoreString("0123456789"); })();
-    };
-    expect_failure(second_chunk, TPLEX_OUT_NO_MEMORY_CHUNK,
-                   "sg_TableOutput (StoreString): Failed to malloc StringStore\n", true);
-    // OpenOutput: the store's chunk, then the table; the empty file stays.
-    const char *messages[] = {"sg_TableOutput: Failed to malloc StringStore\n",
-                              "sg_TableOutput: Failed to malloc relocatables\n"};
-    for (unsigned long n : {1ul, 2ul}) {
-        CaptureStderr err;
-        EXPECT_EQ(failing(n, [&] { return OpenOutput(path.c_str(), TPLEX_OUT_DIAGNOSTICS, 0); })(),
-                  TPLEX_OUT_NO_MEMORY_TABLES);
-        EXPECT_EQ(err.text(), messages[n - 1]);
-        EXPECT_TRUE(exists() && file().empty());
-        EXPECT_EQ(AbandonOutput(0), TPLEX_OUT_NOT_OPEN);
-        FreeOutputTables();
-    }
-    // Memory output: a full chunk whose successor cannot be had loses the byte.
-    ASSERT_EQ(StartMemoryOutput(), TPLEX_OK);
-    for (int i = 0; i < 10000; ++i) PutByte(1);
-    EXPECT_EQ(failing(1, [] { return PutByte(2); })(), TPLEX_OUT_NO_MEMORY_CHUNK);
-    EXPECT_EQ(output_stream.offset, 10000u);
-    EXPECT_EQ(failing(1, StartMemoryOutput)(), TPLEX_OUT_NO_MEMORY_CHUNK);
-    EXPECT_EQ(MemoryOutputSize(), 10000u);  // the earlier image is kept
-}
-#endif
-
 }  // namespace
 }  // namespace tplex::test
