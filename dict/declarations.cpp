@@ -15,7 +15,12 @@ namespace {
 
 inline bool shares_counter(std::uint8_t class_) {
     switch (class_) {
-        case 13: case 14: case 15: case 16: case 19: case 26:
+        case 13:
+        case 14:
+        case 15:
+        case 16:
+        case 19:
+        case 26:
             return true;
         default:
             return false;
@@ -38,7 +43,8 @@ status_code parse_ident(std::uint8_t declare, std::uint8_t class_) {
     if (t.kind == tk_new_identifier) {
         // The number is taken before the insert, so a failed insert uses it up.
         if (declare != 0)
-            return dict_insert(class_, static_cast<std::int16_t>(next_ident_number(class_)), t.text);
+            return dict_insert(class_, static_cast<std::int16_t>(next_ident_number(class_)),
+                               t.text);
         return dict_insert(tk_undeclared, class_, t.text);
     }
     if (t.kind == tk_undeclared) {

@@ -20,10 +20,14 @@ namespace {
 
 constexpr std::uint16_t no_slot = 0xFFFF;
 
-inline char upper(char c) { return (c >= 'a' && c <= 'z') ? static_cast<char>(c - 32) : c; }
+inline char upper(char c) {
+    return (c >= 'a' && c <= 'z') ? static_cast<char>(c - 32) : c;
+}
 
 // The key of a name: its first word_max characters.
-inline std::size_t key_length(const char *name) { return text_length(name, word_max); }
+inline std::size_t key_length(const char *name) {
+    return text_length(name, word_max);
+}
 
 inline std::uint16_t next_slot(std::uint16_t s) {
     return s + 1 == dict_slot_count ? 0 : static_cast<std::uint16_t>(s + 1);
@@ -54,7 +58,8 @@ struct chunk_weights {
 constexpr chunk_weights make_chunk_weights() {
     chunk_weights t{};
     for (int m = 0; m < 7; ++m)
-        for (int i = 0; i < 16; ++i) t.row[m][i] = static_cast<std::int16_t>(64 >> (((m - i) % 7 + 7) % 7));
+        for (int i = 0; i < 16; ++i)
+            t.row[m][i] = static_cast<std::int16_t>(64 >> (((m - i) % 7 + 7) % 7));
     int sum = 0;
     for (int n = 1; n <= word_max; ++n) {
         sum += 64 >> ((n - 1) % 7);
@@ -74,7 +79,8 @@ inline __m128i weigh_chunk(const char *chunk, const std::int16_t *row) {
 
 inline std::uint16_t hash_padded(const char *key, std::size_t n) {
     // Most words fit one chunk; its row comes from a small table, not a division.
-    static constexpr std::uint8_t first_row[17] = {0, 0, 1, 2, 3, 4, 5, 6, 0, 1, 2, 3, 4, 5, 6, 0, 1};
+    static constexpr std::uint8_t first_row[17] = {0, 0, 1, 2, 3, 4, 5, 6, 0,
+                                                   1, 2, 3, 4, 5, 6, 0, 1};
     __m128i sum;
     if (n <= 16) {
         sum = weigh_chunk(key, weights.row[first_row[n]]);
@@ -244,8 +250,8 @@ void dict_set_kind(std::uint8_t kind, std::int16_t code) {
     current_token.value = code;
 }
 
-status_code dict_extend(const char *text1, const char *text2, const char *text3,
-                        std::uint8_t flag1, std::uint8_t flag2, std::uint8_t flag3) {
+status_code dict_extend(const char *text1, const char *text2, const char *text3, std::uint8_t flag1,
+                        std::uint8_t flag2, std::uint8_t flag3) {
     if (dict_slots == nullptr) return TPLEX_NOT_INITIALISED;
     dict_entry *e = slot_entry();
     if (e == nullptr) return TPLEX_DISASTER;  // nothing looked up there to extend

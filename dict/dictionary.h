@@ -74,8 +74,8 @@ void dict_set_kind(std::uint8_t kind, std::int16_t code);
 // Attaches a new definition to the entry at current_token.slot. 0,
 // TPLEX_MALLOC_FAILED, TPLEX_DISASTER (no entry there) or
 // TPLEX_NOT_INITIALISED.
-status_code dict_extend(const char *text1, const char *text2, const char *text3,
-                        std::uint8_t flag1, std::uint8_t flag2, std::uint8_t flag3);
+status_code dict_extend(const char *text1, const char *text2, const char *text3, std::uint8_t flag1,
+                        std::uint8_t flag2, std::uint8_t flag3);
 
 // Lifecycle, run by lex_initialise, the reset and lex_free.
 status_code dict_create();

@@ -2,8 +2,8 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "table_harness.h"
 #include "harness_support.h"
+#include "table_harness.h"
 
 extern "C" int LLVMFuzzerInitialize(int *, char ***) {
     tplex::fuzz::silence_stdio();

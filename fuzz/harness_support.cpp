@@ -1,12 +1,12 @@
 #include "harness_support.h"
 
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
-
-#include <fcntl.h>
-#include <unistd.h>
 
 namespace tplex::fuzz {
 
@@ -97,7 +97,8 @@ void split_input(const std::uint8_t *data, std::size_t size, part *parts, int n)
     for (int i = 0; i < n; ++i) {
         const void *sep = i + 1 < n ? std::memchr(data, 0x1E, size) : nullptr;
         const std::size_t len =
-            sep != nullptr ? static_cast<std::size_t>(static_cast<const std::uint8_t *>(sep) - data) : size;
+            sep != nullptr ? static_cast<std::size_t>(static_cast<const std::uint8_t *>(sep) - data)
+                           : size;
         parts[i] = {data, len};
         if (sep == nullptr) return;
         data += len + 1;

@@ -17,8 +17,8 @@ namespace tplex::fuzz {
 // records as a finding and a test as a crash.
 [[noreturn]] void fail(const char *what, const char *file, int line, long long detail);
 
-#define TPLEX_FUZZ_CHECK(cond, detail)                                             \
-    do {                                                                           \
+#define TPLEX_FUZZ_CHECK(cond, detail)                                                    \
+    do {                                                                                  \
         if (!(cond)) ::tplex::fuzz::fail(#cond, __FILE__, __LINE__, (long long)(detail)); \
     } while (0)
 

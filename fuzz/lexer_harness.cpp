@@ -97,14 +97,22 @@ std::int32_t pick_code(script_reader &s, std::int32_t last) {
     if (b < 0x40) return TPLEX_STATUS(0xD3470200u + b);
     if (b < 0x60) return TPLEX_STATUS(0xD3470000u + (b - 0x40));
     switch (b & 7) {
-        case 0: return last;
-        case 1: return TPLEX_ALREADY_DEFINED;
-        case 2: return 0;
-        case 3: return 36;
-        case 4: return INT32_MIN;
-        case 5: return -1;
-        case 6: return INT32_MAX;
-        default: return static_cast<std::int32_t>(s.u32());
+        case 0:
+            return last;
+        case 1:
+            return TPLEX_ALREADY_DEFINED;
+        case 2:
+            return 0;
+        case 3:
+            return 36;
+        case 4:
+            return INT32_MIN;
+        case 5:
+            return -1;
+        case 6:
+            return INT32_MAX;
+        default:
+            return static_cast<std::int32_t>(s.u32());
     }
 }
 
@@ -113,24 +121,40 @@ std::int32_t pick_code(script_reader &s, std::int32_t last) {
 const char *pick_text(script_reader &s, const lexer_view &v, std::string &store) {
     const std::uint8_t b = s.byte();
     switch (b & 3) {
-        case 0: store.assign(static_cast<std::size_t>(b >> 2) * 50, static_cast<char>('a' + (b & 15)));
-                return store.c_str();
-        case 1: return v.tok->text;
-        case 2: return v.tok->def_text1;
-        default: store = s.text(s.byte()); return store.c_str();
+        case 0:
+            store.assign(static_cast<std::size_t>(b >> 2) * 50, static_cast<char>('a' + (b & 15)));
+            return store.c_str();
+        case 1:
+            return v.tok->text;
+        case 2:
+            return v.tok->def_text1;
+        default:
+            store = s.text(s.byte());
+            return store.c_str();
     }
 }
 
 const char *pick_file(script_reader &s, std::string &store) {
     switch (s.byte() % 8) {
-        case 0: return "inc.src";
-        case 1: return "main.src";
-        case 2: return "missing.src";
-        case 3: return "";
-        case 4: store = work_dir() + "/inc.src"; return store.c_str();
-        case 5: store.assign(300, 'n'); return store.c_str();
-        case 6: return "\\inc.src";
-        default: store = s.text(s.byte() % 32); return store.c_str();
+        case 0:
+            return "inc.src";
+        case 1:
+            return "main.src";
+        case 2:
+            return "missing.src";
+        case 3:
+            return "";
+        case 4:
+            store = work_dir() + "/inc.src";
+            return store.c_str();
+        case 5:
+            store.assign(300, 'n');
+            return store.c_str();
+        case 6:
+            return "\\inc.src";
+        default:
+            store = s.text(s.byte() % 32);
+            return store.c_str();
     }
 }
 
@@ -144,7 +168,7 @@ void predefine(script_reader &s) {
     std::vector<char *> ptrs;
     for (std::string &n : names) ptrs.push_back(n.data());
     const std::int32_t count = (b & 0x80) != 0 ? -static_cast<std::int32_t>(names.size())
-                                                : static_cast<std::int32_t>(names.size());
+                                               : static_cast<std::int32_t>(names.size());
     status(sc_lex_init_defines(ptrs.empty() ? nullptr : ptrs.data(), count));
 }
 
@@ -165,9 +189,11 @@ const bool tracing = std::getenv("TPLEX_FUZZ_TRACE") != nullptr;
 
 void trace(const char *what, std::uint8_t op, const lexer_view &v, std::int32_t last) {
     if (!tracing) return;
-    std::fprintf(stderr, "%-6s op %2d -> %d (0x%x)  kind %u value %d slot %u depth %d macro %u cond %u text \"%.40s\"\n",
-                 what, op, last, static_cast<unsigned>(last), v.tok->kind, v.tok->value, v.tok->slot,
-                 *v.depth, macro_depth, cond_depth, v.tok->text);
+    std::fprintf(stderr,
+                 "%-6s op %2d -> %d (0x%x)  kind %u value %d slot %u depth %d macro %u cond %u "
+                 "text \"%.40s\"\n",
+                 what, op, last, static_cast<unsigned>(last), v.tok->kind, v.tok->value,
+                 v.tok->slot, *v.depth, macro_depth, cond_depth, v.tok->text);
 }
 
 // Rarely wanted calls: internal operations and lifecycle.
@@ -198,16 +224,28 @@ void rare_call(script_reader &s, lexer_view &v) {
         case 2: {
             std::string dir;
             switch (s.byte() % 4) {
-                case 0: dir = "."; break;
-                case 1: dir = work_dir(); break;
-                case 2: dir = "nodir"; break;
-                default: dir.assign(300, 'd'); break;
+                case 0:
+                    dir = ".";
+                    break;
+                case 1:
+                    dir = work_dir();
+                    break;
+                case 2:
+                    dir = "nodir";
+                    break;
+                default:
+                    dir.assign(300, 'd');
+                    break;
             }
             status(add_include_dir(dir.c_str()));
             break;
         }
-        case 3: if (v.heavy()) restart(v, true); break;
-        case 4: if (v.heavy()) restart(v, false); break;
+        case 3:
+            if (v.heavy()) restart(v, true);
+            break;
+        case 4:
+            if (v.heavy()) restart(v, false);
+            break;
         case 5: {
             token_record *t = nullptr;
             TPLEX_FUZZ_CHECK(sc_lex_setup(&t, nullptr, nullptr, nullptr, nullptr) == 0, 0);
@@ -227,11 +265,16 @@ void step(script_reader &s, lexer_view &v, std::int32_t &last) {
     std::string a, b, c;
     const std::uint8_t op = s.byte() & 15;
     struct tracer {
-        const char *what; std::uint8_t op; const lexer_view &v; const std::int32_t &last;
+        const char *what;
+        std::uint8_t op;
+        const lexer_view &v;
+        const std::int32_t &last;
         ~tracer() { trace(what, op, v, last); }
     } t{"step", op, v, last};
     switch (op) {
-        case 0: case 1: case 2:
+        case 0:
+        case 1:
+        case 2:
             last = token_result(sc_next_token(), v);
             break;
         case 3: {
@@ -254,7 +297,9 @@ void step(script_reader &s, lexer_view &v, std::int32_t &last) {
             last = status(dict_extend(t1, t2, t3, f & 1, f & 2, f & 4));
             break;
         }
-        case 6: predefine(s); break;
+        case 6:
+            predefine(s);
+            break;
         case 7:
             if (v.heavy()) last = status(rewind_input());
             break;
@@ -264,14 +309,20 @@ void step(script_reader &s, lexer_view &v, std::int32_t &last) {
             TPLEX_FUZZ_CHECK(r == 0 || r == TPLEX_UNDECLARED_IDENTIFIER, r);
             break;
         }
-        case 9: sg_DisplayError(pick_code(s, last)); break;
+        case 9:
+            sg_DisplayError(pick_code(s, last));
+            break;
         case 10: {
             const char *text = sg_GetError(pick_code(s, last));
             TPLEX_FUZZ_CHECK(text != nullptr && terminated(text, 200), 0);
             break;
         }
-        case 11: *v.declare = s.byte() % 3; break;
-        case 12: last = status(open_source_file(pick_file(s, a))); break;
+        case 11:
+            *v.declare = s.byte() % 3;
+            break;
+        case 12:
+            last = status(open_source_file(pick_file(s, a)));
+            break;
         case 13:
             status(sg_closesources());
             check_no_files(v);
@@ -283,7 +334,9 @@ void step(script_reader &s, lexer_view &v, std::int32_t &last) {
             s.byte();
 #endif
             break;
-        default: rare_call(s, v); break;
+        default:
+            rare_call(s, v);
+            break;
     }
 }
 

@@ -1,12 +1,12 @@
 #include "table_harness.h"
 
+#include <unistd.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <string>
 #include <vector>
-
-#include <unistd.h>
 
 #include "harness_support.h"
 #include "lex/memory.h"
@@ -46,8 +46,9 @@ std::string read_all(const char *name) {
 // inside the table.
 void walk_sound_table(const TableCheck &check) {
     TPLEX_FUZZ_CHECK(check.relocation_offset <= check.size, check.relocation_offset);
-    TPLEX_FUZZ_CHECK(std::uint64_t{check.relocation_count} * 8 <= check.size - check.relocation_offset,
-                     check.relocation_count);
+    TPLEX_FUZZ_CHECK(
+        std::uint64_t{check.relocation_count} * 8 <= check.size - check.relocation_offset,
+        check.relocation_count);
     for (std::uint32_t i = 0; i < check.relocation_count; ++i) {
         const TableRelocation r = table_relocation(check, i);
         TPLEX_FUZZ_CHECK(r.location < check.relocation_offset, r.location);
@@ -62,8 +63,8 @@ void walk_sound_table(const TableCheck &check) {
 struct output_model {
     std::uint32_t flags = 0;
     std::uint32_t tag = 0;
-    bool open = false;           // between a successful OpenOutput and its end
-    std::uint32_t uses = 0;      // references written since it opened
+    bool open = false;               // between a successful OpenOutput and its end
+    std::uint32_t uses = 0;          // references written since it opened
     std::vector<std::uint32_t> ids;  // ids handed out, to be used again
 };
 
@@ -110,8 +111,9 @@ void close_output(output_model &m) {
     mem_fail_at(0);  // the checker's own allocations are not under test
 #endif
     const std::string data = read_all(out_name);
-    if (tracing) std::fprintf(stderr, "table file of %zu bytes:\n%.*s\n", data.size(),
-                              static_cast<int>(data.size() < 400 ? data.size() : 400), data.c_str());
+    if (tracing)
+        std::fprintf(stderr, "table file of %zu bytes:\n%.*s\n", data.size(),
+                     static_cast<int>(data.size() < 400 ? data.size() : 400), data.c_str());
     TableCheck check{};
     const bool sound =
         check_table(reinterpret_cast<const std::uint8_t *>(data.data()), data.size(), check);
@@ -133,13 +135,20 @@ void abandon_output(output_model &m, std::uint32_t free_tables) {
 
 void memory_call(script_reader &s) {
     switch (s.byte() % 5) {
-        case 0: out_status("StartMemoryOutput", StartMemoryOutput()); break;
-        case 1: TPLEX_FUZZ_CHECK(StopMemoryOutput() == 0, 0); break;
-        case 2: TPLEX_FUZZ_CHECK(FreeMemoryOutput() == 0, 0); break;
+        case 0:
+            out_status("StartMemoryOutput", StartMemoryOutput());
+            break;
+        case 1:
+            TPLEX_FUZZ_CHECK(StopMemoryOutput() == 0, 0);
+            break;
+        case 2:
+            TPLEX_FUZZ_CHECK(FreeMemoryOutput() == 0, 0);
+            break;
         default: {
             const std::uint32_t size = MemoryOutputSize();
             std::vector<std::uint8_t> buf(s.byte() % 2 == 0 ? size : size / 2);
-            const std::uint32_t n = CopyMemoryOutput(buf.data(), static_cast<std::uint32_t>(buf.size()));
+            const std::uint32_t n =
+                CopyMemoryOutput(buf.data(), static_cast<std::uint32_t>(buf.size()));
             TPLEX_FUZZ_CHECK(n == buf.size(), n);
             break;
         }
@@ -153,21 +162,33 @@ void rare_call(script_reader &s, output_model &m) {
             mem_fail_at(s.byte() + 1u);
 #endif
             break;
-        case 1: memory_call(s); break;
-        case 2: close_output(m); break;
-        case 3: abandon_output(m, s.byte() & 1); break;
-        case 4: open_output(m); break;
-        case 5: TPLEX_FUZZ_CHECK(FreeOutputTables() == 0, 0); break;
+        case 1:
+            memory_call(s);
+            break;
+        case 2:
+            close_output(m);
+            break;
+        case 3:
+            abandon_output(m, s.byte() & 1);
+            break;
+        case 4:
+            open_output(m);
+            break;
+        case 5:
+            TPLEX_FUZZ_CHECK(FreeOutputTables() == 0, 0);
+            break;
         case 6: {  // runs out of reference ids
             std::uint32_t id = 0;
-            for (int i = 0; i < 50001 && out_status("AllocateReference", AllocateReference(&id)) == 0; ++i) {
+            for (int i = 0;
+                 i < 50001 && out_status("AllocateReference", AllocateReference(&id)) == 0; ++i) {
             }
             break;
         }
         default: {
             std::uint32_t pos = 0;
             const std::string text = pick_string(s);
-            if (out_status("AddToStringStore", AddToStringStore(&pos, text.c_str())) != 0) TPLEX_FUZZ_CHECK(pos == 0, pos);
+            if (out_status("AddToStringStore", AddToStringStore(&pos, text.c_str())) != 0)
+                TPLEX_FUZZ_CHECK(pos == 0, pos);
             break;
         }
     }
@@ -176,16 +197,36 @@ void rare_call(script_reader &s, output_model &m) {
 void step(script_reader &s, output_model &m) {
     std::uint32_t id = 0;
     switch (s.byte() % 16) {
-        case 0: out_status("WriteUInt8", WriteUInt8(s.byte())); break;
-        case 1: out_status("WriteInt8", WriteInt8(static_cast<std::int8_t>(s.byte()))); break;
-        case 2: out_status("WriteUInt16", WriteUInt16(s.u16())); break;
-        case 3: out_status("WriteInt16", WriteInt16(static_cast<std::int16_t>(s.u16()))); break;
-        case 4: out_status("WriteUInt32", WriteUInt32(s.u32())); break;
-        case 5: out_status("WriteInt32", WriteInt32(static_cast<std::int32_t>(s.u32()))); break;
-        case 6: out_status("PutByte", PutByte(s.byte())); break;
-        case 7: out_status("AlignOutput", AlignOutput(s.byte() % 9)); break;
-        case 8: out_status("BeginBlock", BeginBlock()); break;
-        case 9: out_status("EndBlock", EndBlock()); break;
+        case 0:
+            out_status("WriteUInt8", WriteUInt8(s.byte()));
+            break;
+        case 1:
+            out_status("WriteInt8", WriteInt8(static_cast<std::int8_t>(s.byte())));
+            break;
+        case 2:
+            out_status("WriteUInt16", WriteUInt16(s.u16()));
+            break;
+        case 3:
+            out_status("WriteInt16", WriteInt16(static_cast<std::int16_t>(s.u16())));
+            break;
+        case 4:
+            out_status("WriteUInt32", WriteUInt32(s.u32()));
+            break;
+        case 5:
+            out_status("WriteInt32", WriteInt32(static_cast<std::int32_t>(s.u32())));
+            break;
+        case 6:
+            out_status("PutByte", PutByte(s.byte()));
+            break;
+        case 7:
+            out_status("AlignOutput", AlignOutput(s.byte() % 9));
+            break;
+        case 8:
+            out_status("BeginBlock", BeginBlock());
+            break;
+        case 9:
+            out_status("EndBlock", EndBlock());
+            break;
         case 10:
             if (out_status("WriteReference", WriteReference(&id, pick_id(s, m))) == 0) {
                 ++m.uses;
@@ -193,14 +234,17 @@ void step(script_reader &s, output_model &m) {
             }
             break;
         case 11:
-            if (out_status("DefineReferenceHere", DefineReferenceHere(&id, pick_id(s, m), s.byte())) == 0) note_id(m, id);
+            if (out_status("DefineReferenceHere",
+                           DefineReferenceHere(&id, pick_id(s, m), s.byte())) == 0)
+                note_id(m, id);
             break;
         case 12: {
             const std::uint32_t target = pick_id(s, m);
             const std::uint8_t how = s.byte();
             const std::uint32_t offset = how < 0x80 ? s.byte() * 4u : s.u32();
-            out_status("Define/SetTarget", (how & 1) != 0 ? DefineReference(target, offset)
-                                      : SetReferenceTarget(target, offset, how & 2));
+            out_status("Define/SetTarget", (how & 1) != 0
+                                               ? DefineReference(target, offset)
+                                               : SetReferenceTarget(target, offset, how & 2));
             break;
         }
         case 13:
@@ -214,13 +258,16 @@ void step(script_reader &s, output_model &m) {
                 // the offset where its placeholder then goes.
                 const std::uint32_t target = pick_id(s, m);
                 if ((m.flags & TPLEX_OUT_ALIGN) != 0) out_status("AlignOutput", AlignOutput(4));
-                if (out_status("CreateReference", CreateReference(target, output_stream.offset)) == 0) {
+                if (out_status("CreateReference", CreateReference(target, output_stream.offset)) ==
+                    0) {
                     ++m.uses;
                     out_status("WriteUInt32", WriteUInt32(0xA5A5A5A5u));
                 }
             }
             break;
-        default: rare_call(s, m); break;
+        default:
+            rare_call(s, m);
+            break;
     }
 }
 

@@ -10,7 +10,9 @@
 
 extern "C" {
 
-TPLEX_API status_code TPLEX_CALL sc_lex_init(void) { return tplex::lex_initialise(); }
+TPLEX_API status_code TPLEX_CALL sc_lex_init(void) {
+    return tplex::lex_initialise();
+}
 
 TPLEX_API status_code TPLEX_CALL sc_lex_init_file(const char *name) {
     return tplex::open_source_file(name);
@@ -28,23 +30,33 @@ TPLEX_API status_code TPLEX_CALL sc_lex_setup(token_record **token, source_frame
     return 0;
 }
 
-TPLEX_API status_code TPLEX_CALL sc_next_token(void) { return tplex::next_token_filtered(); }
+TPLEX_API status_code TPLEX_CALL sc_next_token(void) {
+    return tplex::next_token_filtered();
+}
 
 TPLEX_API status_code TPLEX_CALL sc_lex_init_defines(char **names, int32_t count) {
     return tplex::sc_lex_init_defines(names, count);
 }
 
-TPLEX_API status_code TPLEX_CALL lex_initialise(void) { return tplex::lex_initialise(); }
+TPLEX_API status_code TPLEX_CALL lex_initialise(void) {
+    return tplex::lex_initialise();
+}
 
-TPLEX_API status_code TPLEX_CALL lex_free(void) { return tplex::lex_free(); }
+TPLEX_API status_code TPLEX_CALL lex_free(void) {
+    return tplex::lex_free();
+}
 
-TPLEX_API void TPLEX_CALL back_token(void) { tplex::back_token(); }
+TPLEX_API void TPLEX_CALL back_token(void) {
+    tplex::back_token();
+}
 
 TPLEX_API status_code TPLEX_CALL open_source_file(const char *name) {
     return tplex::open_source_file(name);
 }
 
-TPLEX_API status_code TPLEX_CALL rewind_input(void) { return tplex::rewind_input(); }
+TPLEX_API status_code TPLEX_CALL rewind_input(void) {
+    return tplex::rewind_input();
+}
 
 TPLEX_API status_code TPLEX_CALL parse_ident(uint8_t declare, uint8_t class_) {
     return tplex::parse_ident(declare, class_);
@@ -56,12 +68,20 @@ TPLEX_API status_code TPLEX_CALL dict_extend(const char *text1, const char *text
     return tplex::dict_extend(text1, text2, text3, flag1, flag2, flag3);
 }
 
-TPLEX_API status_code TPLEX_CALL dict_check(void) { return tplex::dict_check(); }
+TPLEX_API status_code TPLEX_CALL dict_check(void) {
+    return tplex::dict_check();
+}
 
-TPLEX_API void TPLEX_CALL sg_DisplayError(status_code code) { tplex::display_error(code); }
+TPLEX_API void TPLEX_CALL sg_DisplayError(status_code code) {
+    tplex::display_error(code);
+}
 
-TPLEX_API const char *TPLEX_CALL sg_GetError(status_code code) { return tplex::get_error(code); }
+TPLEX_API const char *TPLEX_CALL sg_GetError(status_code code) {
+    return tplex::get_error(code);
+}
 
-TPLEX_API status_code TPLEX_CALL sg_closesources(void) { return tplex::close_sources(); }
+TPLEX_API status_code TPLEX_CALL sg_closesources(void) {
+    return tplex::close_sources();
+}
 
 }  // extern "C"

@@ -108,6 +108,8 @@ void lex_reset() {
     load_keywords();
 }
 
-void back_token() { push_back_flag = 1; }
+void back_token() {
+    push_back_flag = 1;
+}
 
 }  // namespace tplex

@@ -25,6 +25,8 @@ void *mem_alloc(std::size_t size) noexcept {
     return std::malloc(size);
 }
 
-void mem_free(void *block) noexcept { std::free(block); }
+void mem_free(void *block) noexcept {
+    std::free(block);
+}
 
 }  // namespace tplex

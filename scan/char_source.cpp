@@ -82,7 +82,9 @@ void char_source_sync() {
     drop_cursor();
 }
 
-void char_source_forget() { drop_cursor(); }
+void char_source_forget() {
+    drop_cursor();
+}
 
 void drop_macros() {
     char_source_sync();
@@ -112,7 +114,8 @@ std::uint8_t read_char_slow() {
     char_source_sync();
 
     // Macro text first; a frame goes only once its NUL has been handed out.
-    while (macro_depth > 0 && macro_stack[macro_depth - 1].read_pos > macro_stack[macro_depth - 1].length)
+    while (macro_depth > 0 &&
+           macro_stack[macro_depth - 1].read_pos > macro_stack[macro_depth - 1].length)
         --macro_depth;
     if (macro_depth > 0) {
         macro_frame &m = macro_stack[macro_depth - 1];

@@ -27,8 +27,8 @@ inline constexpr std::uint8_t ch_end_of_input = 255;
 // One pending macro body. The read position is wider than a byte, so a body
 // of any length that fits (up to 2499 characters) is read to its end.
 struct macro_frame {
-    std::uint32_t read_pos;  // next character of body
-    std::uint32_t length;    // characters in body before its NUL
+    std::uint32_t read_pos;     // next character of body
+    std::uint32_t length;       // characters in body before its NUL
     char body[text_size + 16];  // the NUL is followed by 15 more zero bytes
 };
 

@@ -20,8 +20,6 @@ namespace {
 
 token_record &tok = current_token;
 
-
-
 // #include: opens the file named by the next token. Whatever follows the
 // name on the line is never read: the new file is read next, and when it
 // ends, reading resumes with the includer's next line.
@@ -162,12 +160,26 @@ status_code process_hash_directive() {
     bool push = false;
     std::uint8_t flag = 0;
     switch (static_cast<std::uint32_t>(tok.value) - hw_define) {
-        case hw_define - hw_define: result = do_define(); break;
-        case hw_ifdef - hw_define: push = true; result = do_ifdef(true, flag); break;
-        case hw_ifndef - hw_define: push = true; result = do_ifdef(false, flag); break;
-        case hw_endif - hw_define: result = do_endif(); break;
-        case hw_include - hw_define: result = do_include(); break;
-        default: result = TPLEX_UNEXPECTED_HASH_WORD; break;
+        case hw_define - hw_define:
+            result = do_define();
+            break;
+        case hw_ifdef - hw_define:
+            push = true;
+            result = do_ifdef(true, flag);
+            break;
+        case hw_ifndef - hw_define:
+            push = true;
+            result = do_ifdef(false, flag);
+            break;
+        case hw_endif - hw_define:
+            result = do_endif();
+            break;
+        case hw_include - hw_define:
+            result = do_include();
+            break;
+        default:
+            result = TPLEX_UNEXPECTED_HASH_WORD;
+            break;
     }
     if (push) {
         // A 21st region is refused: the depth stays at 20, so no flag past

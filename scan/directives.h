@@ -16,7 +16,9 @@ extern std::uint8_t cond_stack[cond_flag_count];
 extern std::uint16_t cond_depth;
 
 // True while tokens of the current region are delivered.
-inline bool region_live() { return cond_stack[cond_depth] == 1; }
+inline bool region_live() {
+    return cond_stack[cond_depth] == 1;
+}
 
 // The next token the parser gets (scan/scanner.cpp, where the filter loop
 // runs over the scanner): its kind, or a failure code. The next call goes on

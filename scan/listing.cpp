@@ -8,14 +8,22 @@ namespace tplex {
 
 const char *kind_name(std::uint8_t kind) {
     switch (kind) {
-        case tk_string: return "String";
-        case tk_reserved_word: return "Reserved Word";
-        case tk_new_identifier: return "Identifier";
-        case tk_hash_word: return "Hash Word";
-        case tk_hash_definition: return "Hash Definition";
-        case tk_pdf_string: return "PDF String";
-        case tk_char: return "Char";
-        default: return "Unknown";
+        case tk_string:
+            return "String";
+        case tk_reserved_word:
+            return "Reserved Word";
+        case tk_new_identifier:
+            return "Identifier";
+        case tk_hash_word:
+            return "Hash Word";
+        case tk_hash_definition:
+            return "Hash Definition";
+        case tk_pdf_string:
+            return "PDF String";
+        case tk_char:
+            return "Char";
+        default:
+            return "Unknown";
     }
 }
 

@@ -18,7 +18,6 @@ namespace tplex {
 
 namespace {
 
-
 // Character classes. Codes from 128 up are in none of the first four.
 enum : std::uint8_t {
     cc_letter = 1,  // A-Z a-z
@@ -39,12 +38,12 @@ constexpr std::array<std::uint8_t, 256> make_classes() {
 }
 constexpr std::array<std::uint8_t, 256> classes = make_classes();
 static_assert(classes['_'] == cc_ident && classes[0] == 0 && classes[255] == 0);
-static_assert(classes['f'] == (cc_letter | cc_hex | cc_ident) && classes['g'] == (cc_letter | cc_ident));
+static_assert(classes['f'] == (cc_letter | cc_hex | cc_ident) &&
+              classes['g'] == (cc_letter | cc_ident));
 
 constexpr std::array<char, 256> make_upper() {
     std::array<char, 256> t{};
-    for (int c = 0; c < 256; ++c)
-        t[c] = static_cast<char>(c >= 'a' && c <= 'z' ? c - 32 : c);
+    for (int c = 0; c < 256; ++c) t[c] = static_cast<char>(c >= 'a' && c <= 'z' ? c - 32 : c);
     return t;
 }
 constexpr std::array<char, 256> upper = make_upper();
@@ -60,9 +59,15 @@ constexpr std::array<char, 256> make_ident_upper() {
 constexpr std::array<char, 256> ident_upper = make_ident_upper();
 #endif
 
-inline bool is_digit(std::uint8_t c) { return (classes[c] & cc_digit) != 0; }
-inline bool is_hex(std::uint8_t c) { return (classes[c] & cc_hex) != 0; }
-inline bool is_ident(std::uint8_t c) { return (classes[c] & cc_ident) != 0; }
+inline bool is_digit(std::uint8_t c) {
+    return (classes[c] & cc_digit) != 0;
+}
+inline bool is_hex(std::uint8_t c) {
+    return (classes[c] & cc_hex) != 0;
+}
+inline bool is_ident(std::uint8_t c) {
+    return (classes[c] & cc_ident) != 0;
+}
 
 constexpr std::size_t string_max = text_size - 1;  // characters a string keeps
 constexpr int32_t keep_scanning = 0;
@@ -87,11 +92,12 @@ TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     for (;;) {
         const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
         const __m128i folded = _mm_or_si128(x, case_bit);
-        const __m128i letter = _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1),
-                                             _mm_cmplt_epi8(folded, z_plus_1));
-        const __m128i digit = _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1),
-                                            _mm_cmplt_epi8(x, nine_plus_1));
-        const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
+        const __m128i letter =
+            _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1), _mm_cmplt_epi8(folded, z_plus_1));
+        const __m128i digit =
+            _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1), _mm_cmplt_epi8(x, nine_plus_1));
+        const __m128i ident =
+            _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
         const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
         if (n < word_max) {  // letters lose their case bit
             const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
@@ -201,10 +207,10 @@ inline const unsigned char *run_end(const unsigned char *p, const stop_set &s) {
     const __m128i b4 = _mm_set1_epi8(static_cast<char>(s.bytes[4]));
     for (;; p += 16) {
         const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
-        const __m128i hit = _mm_or_si128(
-            _mm_or_si128(_mm_cmpeq_epi8(x, b0), _mm_cmpeq_epi8(x, b1)),
-            _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(x, b2), _mm_cmpeq_epi8(x, b3)),
-                         _mm_cmpeq_epi8(x, b4)));
+        const __m128i hit =
+            _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(x, b0), _mm_cmpeq_epi8(x, b1)),
+                         _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(x, b2), _mm_cmpeq_epi8(x, b3)),
+                                      _mm_cmpeq_epi8(x, b4)));
         const unsigned m = static_cast<unsigned>(_mm_movemask_epi8(hit));
         if (m != 0) return p + __builtin_ctz(m);
     }
@@ -309,10 +315,10 @@ enum : std::uint8_t {
     cl_minus,
     cl_less,
     cl_greater,
-    cl_pair,          // an operator alone, or paired with one second character
-    cl_single,        // an operator of one character only
-    cl_slash,         // "/", which may also open a comment
-    cl_star,          // "*", which may also close one
+    cl_pair,    // an operator alone, or paired with one second character
+    cl_single,  // an operator of one character only
+    cl_slash,   // "/", which may also open a comment
+    cl_star,    // "*", which may also close one
 };
 
 struct pair_op {
@@ -357,7 +363,8 @@ constexpr std::array<std::uint8_t, 256> make_dispatch() {
 }
 constexpr std::array<std::uint8_t, 256> dispatch = make_dispatch();
 static_assert(dispatch['_'] == cl_bad && dispatch['$'] == cl_bad && dispatch['\r'] == cl_bad);
-static_assert(dispatch[ch_comment_close] == cl_bad && dispatch[254] == cl_bad && dispatch[128] == cl_bad);
+static_assert(dispatch[ch_comment_close] == cl_bad && dispatch[254] == cl_bad &&
+              dispatch[128] == cl_bad);
 static_assert(dispatch['/'] == cl_slash && dispatch['*'] == cl_star && dispatch['z'] == cl_letter);
 
 // A comment cannot simply pass over the closing bytes, nor the bracket
@@ -378,10 +385,16 @@ void skip_comment(const stop_set &stops) {
 
 // A block comment ends at "*/" (or the end of a body or of input); a line
 // comment takes its line feed, so no end of line follows it.
-void skip_block_comment() { skip_comment<ch_comment_close>(block_stops); }
-void skip_line_comment() { skip_comment<'\n'>(line_stops); }
+void skip_block_comment() {
+    skip_comment<ch_comment_close>(block_stops);
+}
+void skip_line_comment() {
+    skip_comment<'\n'>(line_stops);
+}
 
-inline bool is_blank(std::uint8_t c) { return c == ' ' || c == '\t'; }
+inline bool is_blank(std::uint8_t c) {
+    return c == ' ' || c == '\t';
+}
 
 // Skips blanks straight from the buffer: one or two one at a time, a longer
 // run (indentation) 16 at a time.
@@ -495,7 +508,9 @@ TPLEX_HOT_INLINE status_code scan() {
 
 }  // namespace
 
-bool is_ident_char(std::uint8_t c) { return is_ident(c); }
+bool is_ident_char(std::uint8_t c) {
+    return is_ident(c);
+}
 
 status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) {
     std::uint32_t d;
@@ -511,7 +526,9 @@ status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) 
     return 0;
 }
 
-status_code scan_token() { return scan<false>(); }
+status_code scan_token() {
+    return scan<false>();
+}
 
 // Dropping is not free. In a switched-off region, bodies that name bodies
 // several times over can keep one call dropping tokens for ever (four names

@@ -22,7 +22,9 @@ void set_output_switches(std::uint32_t flags) {
 
 // The block stack is left as it is: the caller balances BeginBlock and
 // EndBlock within one output.
-void begin_stream() { output_stream.offset = 0; }
+void begin_stream() {
+    output_stream.offset = 0;
+}
 
 void report(const char *format, ...) {
     if (!output_stream.diagnostics) return;

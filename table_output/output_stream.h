@@ -54,8 +54,7 @@ void set_output_switches(std::uint32_t flags);
 // Starts a new byte stream at offset 0; open blocks stay open.
 void begin_stream();
 // Prints a failure message on standard error when diagnostics are on.
-void report(const char *format, ...)
-    TPLEX_PRINTF_FORMAT(1, 2);
+void report(const char *format, ...) TPLEX_PRINTF_FORMAT(1, 2);
 // Closes the table file, if still open; later bytes then fail to reach it.
 void close_output_file();
 // Closes the file, reports the write failure, returns TPLEX_OUT_WRITE_FAILED.

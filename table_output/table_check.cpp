@@ -19,8 +19,7 @@ std::uint32_t word_at(const std::uint8_t *p) {
            std::uint32_t{p[3]} << 24;
 }
 
-bool failed(TableCheck &check, const char *format, ...)
-    TPLEX_PRINTF_FORMAT(2, 3);
+bool failed(TableCheck &check, const char *format, ...) TPLEX_PRINTF_FORMAT(2, 3);
 
 bool failed(TableCheck &check, const char *format, ...) {
     va_list args;

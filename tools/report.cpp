@@ -46,7 +46,9 @@ bool capture_stdout(void (*fn)(status_code), status_code code, std::string &out)
     return true;
 }
 
-void display_error(status_code code) { sg_DisplayError(code); }
+void display_error(status_code code) {
+    sg_DisplayError(code);
+}
 
 // Takes apart "\nTemplate compiler error :\nMESSAGE\nFile: PATH    Line: N\nSOURCE".
 Diagnostic parse_diagnostic(const std::string &text) {
@@ -58,13 +60,11 @@ Diagnostic parse_diagnostic(const std::string &text) {
     pos = pos == std::string::npos ? 0 : pos + header.size();
     std::size_t end = text.find('\n', pos);
     d.message = text.substr(pos, end == std::string::npos ? std::string::npos : end - pos);
-    if (end == std::string::npos || text.compare(end + 1, file_tag.size(), file_tag) != 0)
-        return d;
+    if (end == std::string::npos || text.compare(end + 1, file_tag.size(), file_tag) != 0) return d;
     const std::size_t path_start = end + 1 + file_tag.size();
     const std::size_t line_end = text.find('\n', path_start);
-    const std::string position = text.substr(path_start, line_end == std::string::npos
-                                                             ? std::string::npos
-                                                             : line_end - path_start);
+    const std::string position = text.substr(
+        path_start, line_end == std::string::npos ? std::string::npos : line_end - path_start);
     const std::size_t tag = position.rfind(line_tag);
     if (tag == std::string::npos) return d;
     d.has_position = true;
@@ -85,11 +85,21 @@ std::string escaped(const std::string &text, const char *other) {
     for (const char ch : text) {
         const auto c = static_cast<unsigned char>(ch);
         switch (c) {
-            case '\\': out += "\\\\"; break;
-            case '"': out += "\\\""; break;
-            case '\n': out += "\\n"; break;
-            case '\r': out += "\\r"; break;
-            case '\t': out += "\\t"; break;
+            case '\\':
+                out += "\\\\";
+                break;
+            case '"':
+                out += "\\\"";
+                break;
+            case '\n':
+                out += "\\n";
+                break;
+            case '\r':
+                out += "\\r";
+                break;
+            case '\t':
+                out += "\\t";
+                break;
             default:
                 if (c < 32 || c > 126) {
                     char code[8];
@@ -118,20 +128,34 @@ Diagnostic capture_diagnostic(status_code code) {
 
 std::string kind_name(std::uint16_t kind) {
     switch (kind) {
-        case tk_number: return "number";
-        case tk_string: return "string";
-        case tk_operator: return "operator";
-        case tk_macro: return "macro";
-        case tk_end_of_input: return "end-of-input";
-        case tk_reserved_word: return "reserved-word";
-        case tk_new_identifier: return "identifier";
-        case tk_undeclared: return "undeclared";
-        case tk_hash_word: return "hash-word";
-        case tk_hash_definition: return "hash-definition";
-        case tk_pdf_string: return "pdf-string";
-        case tk_char: return "char";
-        case tk_end_of_line: return "end-of-line";
-        default: break;
+        case tk_number:
+            return "number";
+        case tk_string:
+            return "string";
+        case tk_operator:
+            return "operator";
+        case tk_macro:
+            return "macro";
+        case tk_end_of_input:
+            return "end-of-input";
+        case tk_reserved_word:
+            return "reserved-word";
+        case tk_new_identifier:
+            return "identifier";
+        case tk_undeclared:
+            return "undeclared";
+        case tk_hash_word:
+            return "hash-word";
+        case tk_hash_definition:
+            return "hash-definition";
+        case tk_pdf_string:
+            return "pdf-string";
+        case tk_char:
+            return "char";
+        case tk_end_of_line:
+            return "end-of-line";
+        default:
+            break;
     }
     if (kind >= tk_first_class && kind <= tk_last_class) return "class-" + std::to_string(kind);
     return "kind-" + std::to_string(kind);
@@ -144,23 +168,38 @@ bool kind_has_value(std::uint16_t kind) {
 
 std::string operator_spelling(std::int32_t value) {
     switch (value) {
-        case op_slash_equal: return "/=";
-        case op_or_or: return "||";
-        case op_and_and: return "&&";
-        case op_less_equal: return "<=";
-        case op_greater_equal: return ">=";
-        case op_shift_left: return "<<";
-        case op_shift_right: return ">>";
-        case op_dot_dot: return "..";
-        case op_xor_xor: return "^^";
-        case op_not_equal: return "!=";
-        default: return std::string(1, static_cast<char>(value & 0xFF));
+        case op_slash_equal:
+            return "/=";
+        case op_or_or:
+            return "||";
+        case op_and_and:
+            return "&&";
+        case op_less_equal:
+            return "<=";
+        case op_greater_equal:
+            return ">=";
+        case op_shift_left:
+            return "<<";
+        case op_shift_right:
+            return ">>";
+        case op_dot_dot:
+            return "..";
+        case op_xor_xor:
+            return "^^";
+        case op_not_equal:
+            return "!=";
+        default:
+            return std::string(1, static_cast<char>(value & 0xFF));
     }
 }
 
-std::string quoted(const std::string &text) { return escaped(text, "\\x%02x"); }
+std::string quoted(const std::string &text) {
+    return escaped(text, "\\x%02x");
+}
 
-std::string json_string(const std::string &text) { return escaped(text, "\\u%04x"); }
+std::string json_string(const std::string &text) {
+    return escaped(text, "\\u%04x");
+}
 
 std::string hex_code(status_code code) {
     char buffer[16];

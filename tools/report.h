@@ -13,11 +13,11 @@ namespace tplex::tool {
 
 // What sg_DisplayError printed for one failure.
 struct Diagnostic {
-    std::string message;       // its message line ("Bad Character", "unspecified error: ...")
-    bool has_position = false; // false for a code printed without one
-    std::string file;          // the "File:" of the diagnostic
-    long line = 0;             // its "Line:"
-    std::string source;        // the source line it showed, without its line feed
+    std::string message;        // its message line ("Bad Character", "unspecified error: ...")
+    bool has_position = false;  // false for a code printed without one
+    std::string file;           // the "File:" of the diagnostic
+    long line = 0;              // its "Line:"
+    std::string source;         // the source line it showed, without its line feed
 };
 
 // Runs sg_DisplayError(code) with standard output diverted, and takes what

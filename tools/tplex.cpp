@@ -117,8 +117,7 @@ int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
                 files_only = true;
             } else if (arg == "-h" || arg == "--help") {
                 std::printf("usage: tplex %s\n\n%s\n%s%s", cmd.usage, cmd.help,
-                            (cmd.options & takes_lexing) != 0 ? lexing_options : "",
-                            help_option);
+                            (cmd.options & takes_lexing) != 0 ? lexing_options : "", help_option);
                 return exit_clean;
             } else if ((cmd.options & takes_lexing) != 0 &&
                        (arg.compare(0, 2, "-I") == 0 || arg.compare(0, 2, "-D") == 0)) {
@@ -196,9 +195,7 @@ public:
 
     // Where the token just delivered ends: the file being read and its line.
     // At the end of input no file is open any more: the main file's last line.
-    std::string file() const {
-        return *depth_ >= 1 ? frames_[*depth_].path : main_file_;
-    }
+    std::string file() const { return *depth_ >= 1 ? frames_[*depth_].path : main_file_; }
     unsigned long line() const {
         const source_frame &f = frames_[*depth_ >= 1 ? *depth_ : 1];
         return static_cast<std::uint32_t>(f.line_no + 1u);
@@ -243,8 +240,7 @@ private:
 
 void report_stuck(const std::string &file, long line) {
     std::fflush(stdout);
-    std::fprintf(stderr,
-                 "%s: %s:%ld: the same failure came %lu times without progress; stopped\n",
+    std::fprintf(stderr, "%s: %s:%ld: the same failure came %lu times without progress; stopped\n",
                  program, file.c_str(), line, stuck_limit);
 }
 
@@ -296,8 +292,7 @@ void print_token(const Session &s, bool json) {
                     json_string(token_text(t)).c_str());
     } else {
         std::printf("%s:%lu: %-15s %11s %s\n", s.file().c_str(), s.line(),
-                    kind_name(t.kind).c_str(),
-                    has_value ? std::to_string(t.value).c_str() : "-",
+                    kind_name(t.kind).c_str(), has_value ? std::to_string(t.value).c_str() : "-",
                     quoted(token_text(t)).c_str());
     }
 }
@@ -460,4 +455,6 @@ int run(int argc, char **argv) {
 
 }  // namespace tplex::tool
 
-int main(int argc, char **argv) { return tplex::tool::run(argc, argv); }
+int main(int argc, char **argv) {
+    return tplex::tool::run(argc, argv);
+}

@@ -33,12 +33,12 @@ enum bench_mode { bench_checksum, bench_count, bench_dump };
 
 typedef struct bench_sink {
     enum bench_mode mode;
-    uint64_t hash;    /* FNV-1a state (checksum mode) */
-    uint64_t tokens;  /* tokens delivered before the end of input */
-    uint64_t mix;     /* kinds and values folded together (count mode) */
-    uint64_t lines;   /* lines read (the read ceilings) */
-    struct timespec start;      /* wall clock */
-    struct timespec cpu_start;  /* this process's CPU time */
+    uint64_t hash;             /* FNV-1a state (checksum mode) */
+    uint64_t tokens;           /* tokens delivered before the end of input */
+    uint64_t mix;              /* kinds and values folded together (count mode) */
+    uint64_t lines;            /* lines read (the read ceilings) */
+    struct timespec start;     /* wall clock */
+    struct timespec cpu_start; /* this process's CPU time */
 } bench_sink;
 
 static inline uint64_t bench_fnv(uint64_t h, const unsigned char *p, size_t n) {
@@ -50,7 +50,9 @@ static inline uint64_t bench_fnv(uint64_t h, const unsigned char *p, size_t n) {
     return h;
 }
 
-static inline int bench_has_value(unsigned kind) { return kind == 1 || kind == 3 || kind == 9; }
+static inline int bench_has_value(unsigned kind) {
+    return kind == 1 || kind == 3 || kind == 9;
+}
 
 static inline int bench_has_text(unsigned kind) {
     return kind == 1 || kind == 2 || kind == 9 || kind == 10 || kind == 33 || kind == 34;

@@ -81,8 +81,7 @@ int main(int argc, char **argv) {
     sg_closesources();
     lex_free();
     if (kind_mismatch) {
-        fprintf(stderr, "tplex_driver: %lu results differ from the record's kind\n",
-                kind_mismatch);
+        fprintf(stderr, "tplex_driver: %lu results differ from the record's kind\n", kind_mismatch);
         status = 1;
     }
     bench_report(&s, "tplex");

@@ -300,29 +300,26 @@ class Vocabulary {
 public:
     explicit Vocabulary(Rng &rng) {
         static const char *const roots[] = {
-            "link",    "setup",   "release", "ack",     "data",    "conn",    "hdr",
-            "seq",     "addr",    "port",    "chan",    "retry",   "frame",   "octet",
-            "flag",    "mode",    "cause",   "reason",  "result",  "status",  "param",
-            "count",   "offset",  "peer",    "node",    "call",    "session", "credit",
-            "buffer",  "queue",   "event",   "idle",    "busy",    "wait",    "ready",
-            "alarm",   "config",  "unit",    "slot",    "cell",    "trunk",   "line",
-            "digit",   "tone",    "cmd",     "resp",    "req",     "ind",     "cnf",
-            "poll",    "final",   "nr",      "ns",      "tei",     "sapi",    "dlci",
-            "vpi",     "vci",     "pdu",     "sdu",     "rx",      "tx",      "err",
-            "fault",   "reset",   "restart", "connect", "disc",    "alert",   "proceed",
-            "progress", "notify", "suspend", "resume",  "info",    "facility", "bearer",
-            "channel", "called",  "calling", "party",   "number",  "subaddr", "display",
-            "keypad",  "signal",  "cause",   "state",   "timer",   "guard",   "hold",
-            "transfer", "conf",   "mute",    "level",   "gain",    "codec",   "rate",
-            "clock",   "sync",    "phase",   "epoch",   "tick",    "budget",  "quota"};
-        static const char *const prefixes[] = {"",     "",     "",      "sig_", "st_",
-                                               "t_",   "m_",   "f_",    "p_",   "tmr_",
-                                               "cnt_", "max_", "min_",  "num_", "is_",
-                                               "last_", "next_", "cur_", "old_", "new_"};
-        static const char *const suffixes[] = {"",     "",    "",     "",     "_req", "_ind",
-                                               "_rsp", "_cnf", "_id", "_len", "_lo",  "_hi",
-                                               "1",    "2",   "3",    "_a",   "_b",   "_ext",
-                                               "_v2",  "_tbl", "_ptr", "_max", "_min", "_mask"};
+            "link",    "setup",   "release", "ack",      "data",   "conn",    "hdr",      "seq",
+            "addr",    "port",    "chan",    "retry",    "frame",  "octet",   "flag",     "mode",
+            "cause",   "reason",  "result",  "status",   "param",  "count",   "offset",   "peer",
+            "node",    "call",    "session", "credit",   "buffer", "queue",   "event",    "idle",
+            "busy",    "wait",    "ready",   "alarm",    "config", "unit",    "slot",     "cell",
+            "trunk",   "line",    "digit",   "tone",     "cmd",    "resp",    "req",      "ind",
+            "cnf",     "poll",    "final",   "nr",       "ns",     "tei",     "sapi",     "dlci",
+            "vpi",     "vci",     "pdu",     "sdu",      "rx",     "tx",      "err",      "fault",
+            "reset",   "restart", "connect", "disc",     "alert",  "proceed", "progress", "notify",
+            "suspend", "resume",  "info",    "facility", "bearer", "channel", "called",   "calling",
+            "party",   "number",  "subaddr", "display",  "keypad", "signal",  "cause",    "state",
+            "timer",   "guard",   "hold",    "transfer", "conf",   "mute",    "level",    "gain",
+            "codec",   "rate",    "clock",   "sync",     "phase",  "epoch",   "tick",     "budget",
+            "quota"};
+        static const char *const prefixes[] = {
+            "",     "",     "",     "sig_", "st_", "t_",    "m_",    "f_",   "p_",   "tmr_",
+            "cnt_", "max_", "min_", "num_", "is_", "last_", "next_", "cur_", "old_", "new_"};
+        static const char *const suffixes[] = {
+            "",  "",  "",  "",   "_req", "_ind", "_rsp", "_cnf", "_id",  "_len", "_lo",  "_hi",
+            "1", "2", "3", "_a", "_b",   "_ext", "_v2",  "_tbl", "_ptr", "_max", "_min", "_mask"};
         const size_t nr = sizeof roots / sizeof roots[0];
         const size_t np = sizeof prefixes / sizeof prefixes[0];
         const size_t ns = sizeof suffixes / sizeof suffixes[0];
@@ -356,7 +353,8 @@ public:
     // percent of all uses each, most are rare.
     const std::string &draw(Rng &rng) {
         double u = static_cast<double>(rng.next() >> 11) / 9007199254740992.0 * cumulative_.back();
-        size_t i = std::lower_bound(cumulative_.begin(), cumulative_.end(), u) - cumulative_.begin();
+        size_t i =
+            std::lower_bound(cumulative_.begin(), cumulative_.end(), u) - cumulative_.begin();
         return names_[std::min(i, kSize - 1)];
     }
 
@@ -389,17 +387,86 @@ private:
 // Text for comments and literals.
 
 const std::vector<std::string> &prose_words() {
-    static const std::vector<std::string> w = {
-        "the",     "link",    "is",      "released", "when",   "timer",  "expires",  "and",
-        "no",      "answer",  "was",     "received", "from",   "peer",   "entity",   "a",
-        "frame",   "with",    "bad",     "check",    "sum",    "drops",  "silently", "see",
-        "section", "clause",  "note",    "value",    "must",   "not",    "exceed",   "window",
-        "size",    "octets",  "are",     "sent",     "first",  "high",   "bit",      "order",
-        "state",   "machine", "for",     "call",     "control", "of",    "layer",    "three",
-        "retry",   "count",   "reset",   "on",       "restart", "define", "include", "ifdef",
-        "endif",   "TODO:",   "FIXME",   "(see",     "above)", "e.g.",   "i.e.",     "->",
-        "=>",      "<tag>",   "#1",      "100%",     "x<y",    "a>b",    "it's",     "\"quoted\"",
-        "caf\xc3\xa9", "na\xc3\xafve", "25\xc2\xb0" "C", "\xe2\x86\x92", "ok,", "done.", "n/a"};
+    static const std::vector<std::string> w = {"the",
+                                               "link",
+                                               "is",
+                                               "released",
+                                               "when",
+                                               "timer",
+                                               "expires",
+                                               "and",
+                                               "no",
+                                               "answer",
+                                               "was",
+                                               "received",
+                                               "from",
+                                               "peer",
+                                               "entity",
+                                               "a",
+                                               "frame",
+                                               "with",
+                                               "bad",
+                                               "check",
+                                               "sum",
+                                               "drops",
+                                               "silently",
+                                               "see",
+                                               "section",
+                                               "clause",
+                                               "note",
+                                               "value",
+                                               "must",
+                                               "not",
+                                               "exceed",
+                                               "window",
+                                               "size",
+                                               "octets",
+                                               "are",
+                                               "sent",
+                                               "first",
+                                               "high",
+                                               "bit",
+                                               "order",
+                                               "state",
+                                               "machine",
+                                               "for",
+                                               "call",
+                                               "control",
+                                               "of",
+                                               "layer",
+                                               "three",
+                                               "retry",
+                                               "count",
+                                               "reset",
+                                               "on",
+                                               "restart",
+                                               "define",
+                                               "include",
+                                               "ifdef",
+                                               "endif",
+                                               "TODO:",
+                                               "FIXME",
+                                               "(see",
+                                               "above)",
+                                               "e.g.",
+                                               "i.e.",
+                                               "->",
+                                               "=>",
+                                               "<tag>",
+                                               "#1",
+                                               "100%",
+                                               "x<y",
+                                               "a>b",
+                                               "it's",
+                                               "\"quoted\"",
+                                               "caf\xc3\xa9",
+                                               "na\xc3\xafve",
+                                               "25\xc2\xb0"
+                                               "C",
+                                               "\xe2\x86\x92",
+                                               "ok,",
+                                               "done.",
+                                               "n/a"};
     return w;
 }
 
@@ -533,7 +600,8 @@ private:
         } else if (r < 770) {
             int n = rng_.range(11, 40);
             digits = std::to_string(1 + rng_.below(9));
-            while (static_cast<int>(digits.size()) < n) digits += static_cast<char>('0' + rng_.below(10));
+            while (static_cast<int>(digits.size()) < n)
+                digits += static_cast<char>('0' + rng_.below(10));
         } else if (r < 910) {
             bool lower = rng_.percent(50);
             int n = r < 900 ? rng_.range(1, 8) : rng_.range(9, 24);
@@ -554,8 +622,10 @@ private:
 
     void string_lit() {
         unsigned r = rng_.below(1000);
-        size_t len = r < 700 ? rng_.range(0, 24) : r < 950 ? rng_.range(25, 120)
-                   : r < 995 ? rng_.range(120, 400) : rng_.range(400, 2300);
+        size_t len = r < 700   ? rng_.range(0, 24)
+                     : r < 950 ? rng_.range(25, 120)
+                     : r < 995 ? rng_.range(120, 400)
+                               : rng_.range(400, 2300);
         w_.string_lit(literal_text(rng_, len, r >= 900), false);
     }
 
@@ -593,7 +663,8 @@ private:
         if (r < 30) {
             w_.raw("/*\n");
             int n = rng_.range(1, 6);
-            for (int i = 0; i < n; i++) w_.raw(" * " + comment_text(rng_, rng_.range(3, 14)) + "\n");
+            for (int i = 0; i < n; i++)
+                w_.raw(" * " + comment_text(rng_, rng_.range(3, 14)) + "\n");
             w_.raw(" */\n");
         } else if (r < 40) {
             std::string stars(static_cast<size_t>(rng_.range(10, 70)), '*');
@@ -601,7 +672,8 @@ private:
                    "/\n");
         } else if (r < 70) {
             int n = rng_.range(1, 3);
-            for (int i = 0; i < n; i++) w_.raw("// " + comment_text(rng_, rng_.range(2, 12)) + "\n");
+            for (int i = 0; i < n; i++)
+                w_.raw("// " + comment_text(rng_, rng_.range(2, 12)) + "\n");
         }
         if (rng_.percent(30)) w_.newline();
         w_.set_tab_indent(rng_.percent(20));
@@ -635,7 +707,8 @@ private:
         bool outer = w_.live();
         bool ifdef = rng_.percent(60);
         bool defined = rng_.percent(65);
-        const std::vector<std::string> &names = defined ? dir_->defined_flags : dir_->undefined_flags;
+        const std::vector<std::string> &names =
+            defined ? dir_->defined_flags : dir_->undefined_flags;
         const std::string &name = rng_.pick(names);
         w_.raw(std::string(ifdef ? "#ifdef " : "#ifndef ") + name + "\n");
         w_.set_live(outer && (ifdef == defined));
@@ -669,9 +742,9 @@ private:
         } else if (r < 73) {
             pdf_lit();
         } else if (r < 78) {
-            static const char *const atoms[] = {"TRUE",   "FALSE",  "NOW",     "SELF", "SENDER",
-                                                "PARENT", "OFFSPRING", "VALID", "INVALID", "UNKNOWN",
-                                                "UNDEFINED", "ACTIVE"};
+            static const char *const atoms[] = {"TRUE",    "FALSE",   "NOW",       "SELF",
+                                                "SENDER",  "PARENT",  "OFFSPRING", "VALID",
+                                                "INVALID", "UNKNOWN", "UNDEFINED", "ACTIVE"};
             kw(atoms[rng_.below(12)]);
         } else if (r < 83) {
             id();
@@ -718,8 +791,8 @@ private:
 
     void expr(int depth) {
         static const char *const binary[] = {
-            "+",  "-",  "*",  "/",  "%",  "=",  "/=", "!=", "<",  ">",  "<=", ">=", "<<", ">>",
-            "&",  "|",  "^",  "&&", "||", "^^", "..", "+",  "-",  "=",  "<",  ">",  "*",  "&&"};
+            "+", "-", "*", "/",  "%",  "=",  "/=", "!=", "<", ">", "<=", ">=", "<<", ">>",
+            "&", "|", "^", "&&", "||", "^^", "..", "+",  "-", "=", "<",  ">",  "*",  "&&"};
         primary(depth);
         int n = depth >= 3 ? 0 : (rng_.percent(55) ? 0 : rng_.range(1, 3));
         for (int i = 0; i < n; i++) {
@@ -734,9 +807,9 @@ private:
     }
 
     void type_name() {
-        static const char *const types[] = {"INT",    "UINT", "BYTE",     "UBYTE",    "BIT",
-                                            "NIBBLE", "BOOL", "CHARSTRING", "PID",    "TIME",
-                                            "DURATION", "TIMESTAMP", "UINT", "INT", "BYTE"};
+        static const char *const types[] = {"INT",      "UINT",      "BYTE",       "UBYTE", "BIT",
+                                            "NIBBLE",   "BOOL",      "CHARSTRING", "PID",   "TIME",
+                                            "DURATION", "TIMESTAMP", "UINT",       "INT",   "BYTE"};
         if (macro_use()) return;
         if (rng_.percent(80))
             kw(types[rng_.below(15)]);
@@ -787,7 +860,8 @@ private:
             if (rng_.percent(40)) {
                 kw("TO");
                 if (rng_.percent(50)) {
-                    static const char *const dests[] = {"SENDER", "PARENT", "OFFSPRING", "SELF", "ENV"};
+                    static const char *const dests[] = {"SENDER", "PARENT", "OFFSPRING", "SELF",
+                                                        "ENV"};
                     kw(dests[rng_.below(5)]);
                 } else {
                     id();
@@ -847,8 +921,8 @@ private:
             w_.op(")");
             semi();
         } else if (r < 72) {
-            static const char *const words[] = {"JOIN", "LINK", "UNLINK", "USE", "STREAM",
-                                                "CONTROL", "PC", "DASS", "CALLTRACEID"};
+            static const char *const words[] = {"JOIN",    "LINK", "UNLINK", "USE",        "STREAM",
+                                                "CONTROL", "PC",   "DASS",   "CALLTRACEID"};
             kw(words[rng_.below(9)]);
             id();
             if (rng_.percent(50)) {
@@ -871,9 +945,9 @@ private:
             w_.op("}");
             semi();
         } else if (r < 82) {
-            static const char *const words[] = {"EVENTTYPE", "EVENTSTATUS", "RECORDNUMBER",
-                                                "PREVIOUSINSEQ", "SELECTCODE", "PROCESSKEY",
-                                                "TIMESTAMP", "DURATION", "TIME"};
+            static const char *const words[] = {"EVENTTYPE",     "EVENTSTATUS", "RECORDNUMBER",
+                                                "PREVIOUSINSEQ", "SELECTCODE",  "PROCESSKEY",
+                                                "TIMESTAMP",     "DURATION",    "TIME"};
             kw(words[rng_.below(9)]);
             id();
             w_.op(":");
@@ -996,7 +1070,10 @@ private:
             kw("SIGNALROUTE");
             id();
             kw("FROM");
-            if (rng_.percent(40)) kw("ENV"); else id();
+            if (rng_.percent(40))
+                kw("ENV");
+            else
+                id();
             kw("TO");
             id();
             kw("WITH");
@@ -1183,7 +1260,7 @@ private:
             if (rng_.percent(15)) {
                 w_.indent(2);
                 static const char *const words[] = {"STANDARD", "USERINTERFACE", "SOURCE",
-                                                    "ALL", "BOOL", "STATE"};
+                                                    "ALL",      "BOOL",          "STATE"};
                 kw(words[rng_.below(6)]);
                 id();
                 semi();
@@ -1207,9 +1284,9 @@ private:
 std::string macro_name(Rng &rng, const Vocabulary &vocab, std::unordered_set<std::string> &used) {
     static const char *const a[] = {"MAX",  "MIN",  "DEFAULT", "CFG",   "NUM",  "LEN",
                                     "SIZE", "BASE", "LIMIT",   "FIRST", "LAST", "INIT"};
-    static const char *const b[] = {"LINKS", "RETRY", "TIMEOUT", "FRAME", "WINDOW", "OCTETS",
-                                    "SLOTS", "PEERS", "CALLS",   "DIGITS", "TONES", "CELLS",
-                                    "MASK",  "TYPE",  "GREETING", "LEVEL", "GAIN",  "RATE"};
+    static const char *const b[] = {"LINKS", "RETRY", "TIMEOUT",  "FRAME",  "WINDOW", "OCTETS",
+                                    "SLOTS", "PEERS", "CALLS",    "DIGITS", "TONES",  "CELLS",
+                                    "MASK",  "TYPE",  "GREETING", "LEVEL",  "GAIN",   "RATE"};
     static std::unordered_set<std::string> vocab_upper;
     if (vocab_upper.empty())
         for (const std::string &n : vocab.names()) vocab_upper.insert(upper(n));
@@ -1271,7 +1348,10 @@ Macro make_macro_once(Rng &rng, Vocabulary &vocab, std::unordered_set<std::strin
         int n = rng.range(1, 4);
         for (int i = 0; i < n; i++) {
             add_op(',');
-            if (rng.percent(50)) add_word(vocab.draw(rng)); else add_number();
+            if (rng.percent(50))
+                add_word(vocab.draw(rng));
+            else
+                add_number();
         }
     }
     return m;
@@ -1345,7 +1425,8 @@ Result generate(const std::string &variant, uint64_t size, uint64_t seed, const 
         std::unordered_set<std::string> used;
         for (int i = 0; i < 96; i++) dir.macros.push_back(make_macro(rng, vocab, used));
         for (int i = 0; i < 24; i++) dir.defined_flags.push_back("FEATURE_" + std::to_string(i));
-        for (int i = 0; i < 24; i++) dir.undefined_flags.push_back("NO_FEATURE_" + std::to_string(i));
+        for (int i = 0; i < 24; i++)
+            dir.undefined_flags.push_back("NO_FEATURE_" + std::to_string(i));
         // Include files, the deepest first: files 4..7 include nothing,
         // files 0..3 may include 4..7; the main file includes 0..3.
         const int kIncludes = 8;

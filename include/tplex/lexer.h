@@ -29,21 +29,21 @@
  * caller-cleans convention (__cdecl on 32-bit Windows). Build the library
  * with TPLEX_BUILDING defined; link the static archive with TPLEX_STATIC. */
 #if defined(_WIN32) || defined(__CYGWIN__)
-#  define TPLEX_CALL __cdecl
-#  if defined(TPLEX_BUILDING)
-#    define TPLEX_API __declspec(dllexport)
-#  elif defined(TPLEX_STATIC)
-#    define TPLEX_API
-#  else
-#    define TPLEX_API __declspec(dllimport)
-#  endif
+#define TPLEX_CALL __cdecl
+#if defined(TPLEX_BUILDING)
+#define TPLEX_API __declspec(dllexport)
+#elif defined(TPLEX_STATIC)
+#define TPLEX_API
 #else
-#  define TPLEX_CALL
-#  if defined(TPLEX_BUILDING)
-#    define TPLEX_API __attribute__((visibility("default")))
-#  else
-#    define TPLEX_API
-#  endif
+#define TPLEX_API __declspec(dllimport)
+#endif
+#else
+#define TPLEX_CALL
+#if defined(TPLEX_BUILDING)
+#define TPLEX_API __attribute__((visibility("default")))
+#else
+#define TPLEX_API
+#endif
 #endif
 
 #ifdef __cplusplus
@@ -58,6 +58,7 @@ extern "C" {
  * source depth). Failures are negative: 0xD347xxxx, and 0xD3431001. */
 typedef int32_t status_code;
 
+/* clang-format off */
 #define TPLEX_STATUS(v) ((status_code)(int32_t)(uint32_t)(v))
 
 #define TPLEX_OK 0
@@ -142,16 +143,18 @@ typedef int32_t status_code;
 #define TPLEX_OUT_NO_OPEN_BLOCK        TPLEX_STATUS(0xD347001Bu) /* EndBlock with no block open */
 #define TPLEX_OUT_STRING_TOO_LONG      TPLEX_STATUS(0xD347001Cu) /* a string of 10000 characters or more; nothing stored */
 
+/* clang-format on */
+
 /* ------------------------------------------------------------------------ */
 /* Token kinds                                                              */
 /* ------------------------------------------------------------------------ */
 
 /* The kind of a token in token_record.kind, and of a dictionary entry. */
 enum token_kind {
-    tk_number = 1,           /* value: the number; text: its digits */
-    tk_string = 2,           /* text: contents without the quotes */
-    tk_operator = 3,         /* value: character code, or 2..11 for a pair */
-    tk_macro = 4,            /* name defined with a body (never delivered) */
+    tk_number = 1,   /* value: the number; text: its digits */
+    tk_string = 2,   /* text: contents without the quotes */
+    tk_operator = 3, /* value: character code, or 2..11 for a pair */
+    tk_macro = 4,    /* name defined with a body (never delivered) */
     tk_end_of_input = 5,
     tk_reserved_word = 9,    /* value: reserved word code 0..117 */
     tk_new_identifier = 10,  /* text: the name, upper case */
@@ -161,9 +164,9 @@ enum token_kind {
     tk_hash_word = 24,       /* value: 201..205 (never delivered) */
     tk_hash_definition = 25, /* value: 0 (#define) or 2 (predefined) */
     tk_last_class = 27,
-    tk_pdf_string = 33,      /* text: contents without <" and "> */
-    tk_char = 34,            /* text: the one character */
-    tk_end_of_line = 36      /* a scan result only (never delivered) */
+    tk_pdf_string = 33, /* text: contents without <" and "> */
+    tk_char = 34,       /* text: the one character */
+    tk_end_of_line = 36 /* a scan result only (never delivered) */
 };
 
 /* Operator values of the two-character operators (kind tk_operator). */
@@ -193,10 +196,10 @@ enum hash_word_code {
 /* Limits                                                                   */
 /* ------------------------------------------------------------------------ */
 
-#define TPLEX_TEXT_SIZE 2500       /* token texts and definition texts */
-#define TPLEX_LINE_SIZE 5000       /* a source line buffer */
-#define TPLEX_PATH_SIZE 200        /* a source frame's path */
-#define TPLEX_SOURCE_FRAMES 20     /* source stack frames; frame 0 holds no file */
+#define TPLEX_TEXT_SIZE 2500   /* token texts and definition texts */
+#define TPLEX_LINE_SIZE 5000   /* a source line buffer */
+#define TPLEX_PATH_SIZE 200    /* a source frame's path */
+#define TPLEX_SOURCE_FRAMES 20 /* source stack frames; frame 0 holds no file */
 #define TPLEX_RESERVED_WORDS 118
 #define TPLEX_HASH_WORDS 5
 
@@ -207,14 +210,14 @@ enum hash_word_code {
 /* current_token: the one record of the token scanned last. Fields that a
  * token does not set keep what the token before left there. */
 typedef struct token_record {
-    uint16_t kind;                    /* token kind */
-    int32_t value;                    /* number, operator or dictionary code */
-    char text[TPLEX_TEXT_SIZE];       /* token text, NUL-terminated */
-    uint16_t slot;                    /* dictionary slot of the last lookup */
-    char def_text1[TPLEX_TEXT_SIZE];  /* definition texts of the entry found */
+    uint16_t kind;                   /* token kind */
+    int32_t value;                   /* number, operator or dictionary code */
+    char text[TPLEX_TEXT_SIZE];      /* token text, NUL-terminated */
+    uint16_t slot;                   /* dictionary slot of the last lookup */
+    char def_text1[TPLEX_TEXT_SIZE]; /* definition texts of the entry found */
     char def_text2[TPLEX_TEXT_SIZE];
     char def_text3[TPLEX_TEXT_SIZE];
-    uint8_t has_definition;           /* 1 when the entry found has them */
+    uint8_t has_definition; /* 1 when the entry found has them */
     uint8_t def_flag1;
     uint8_t def_flag2;
     uint8_t def_flag3;
@@ -222,29 +225,29 @@ typedef struct token_record {
 
 /* One frame of the source stack: a file being read. */
 typedef struct source_frame {
-    uint16_t read_pos;                /* next character in line_text */
-    uint32_t line_no;                 /* 0-based line number; all ones before the first */
-    char path[TPLEX_PATH_SIZE];       /* the path the file was opened under */
-    char line_text[TPLEX_LINE_SIZE];  /* the current line, with its line feed */
-    FILE *file;                       /* the open stream, or null */
+    uint16_t read_pos;               /* next character in line_text */
+    uint32_t line_no;                /* 0-based line number; all ones before the first */
+    char path[TPLEX_PATH_SIZE];      /* the path the file was opened under */
+    char line_text[TPLEX_LINE_SIZE]; /* the current line, with its line feed */
+    FILE *file;                      /* the open stream, or null */
 } source_frame;
 
 /* One record of the reserved word table; 118 of them back to back. */
 typedef struct reserved_word_record {
-    uint16_t code;                    /* equals the record's index */
-    char word[TPLEX_TEXT_SIZE];       /* upper case, zero-filled */
+    uint16_t code;              /* equals the record's index */
+    char word[TPLEX_TEXT_SIZE]; /* upper case, zero-filled */
 } reserved_word_record;
 
 /* The layout is part of the interface: pin it. */
 #if defined(__cplusplus)
-#  define TPLEX_STATIC_ASSERT(c, m) static_assert(c, m)
+#define TPLEX_STATIC_ASSERT(c, m) static_assert(c, m)
 #elif defined(__STDC_VERSION__) && __STDC_VERSION__ >= 201112L
-#  define TPLEX_STATIC_ASSERT(c, m) _Static_assert(c, m)
+#define TPLEX_STATIC_ASSERT(c, m) _Static_assert(c, m)
 #else
-#  define TPLEX_SA_CAT2(a, b) a##b
-#  define TPLEX_SA_CAT(a, b) TPLEX_SA_CAT2(a, b)
-#  define TPLEX_STATIC_ASSERT(c, m) \
-       typedef char TPLEX_SA_CAT(tplex_layout_check_, __LINE__)[(c) ? 1 : -1]
+#define TPLEX_SA_CAT2(a, b) a##b
+#define TPLEX_SA_CAT(a, b) TPLEX_SA_CAT2(a, b)
+#define TPLEX_STATIC_ASSERT(c, m) \
+    typedef char TPLEX_SA_CAT(tplex_layout_check_, __LINE__)[(c) ? 1 : -1]
 #endif
 
 #define TPLEX_OFFSET(t, f) offsetof(t, f)
@@ -256,7 +259,8 @@ TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, slot) == 2508, "token_record.slot
 TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, def_text1) == 2510, "token_record.def_text1");
 TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, def_text2) == 5010, "token_record.def_text2");
 TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, def_text3) == 7510, "token_record.def_text3");
-TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, has_definition) == 10010, "token_record.has_definition");
+TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, has_definition) == 10010,
+                    "token_record.has_definition");
 TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, def_flag1) == 10011, "token_record.def_flag1");
 TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, def_flag2) == 10012, "token_record.def_flag2");
 TPLEX_STATIC_ASSERT(TPLEX_OFFSET(token_record, def_flag3) == 10013, "token_record.def_flag3");

@@ -33,10 +33,10 @@ extern "C" {
 /* Flags of OpenOutput()                                                    */
 /* ------------------------------------------------------------------------ */
 
-#define TPLEX_OUT_ALIGN 0x01u          /* align 16-bit values to 2, 32-bit values to 4 */
-#define TPLEX_OUT_HEX_TEXT 0x02u       /* write the file as hexadecimal text */
-#define TPLEX_OUT_DROP_NEWLINES 0x04u  /* StoreString drops the backslash-n escape */
-#define TPLEX_OUT_DIAGNOSTICS 0x08u    /* print failure messages on standard error */
+#define TPLEX_OUT_ALIGN 0x01u             /* align 16-bit values to 2, 32-bit values to 4 */
+#define TPLEX_OUT_HEX_TEXT 0x02u          /* write the file as hexadecimal text */
+#define TPLEX_OUT_DROP_NEWLINES 0x04u     /* StoreString drops the backslash-n escape */
+#define TPLEX_OUT_DIAGNOSTICS 0x08u       /* print failure messages on standard error */
 #define TPLEX_OUT_LITERAL_BACKSLASH 0x10u /* StoreString keeps backslashes as they are */
 
 /* ------------------------------------------------------------------------ */

@@ -1,5 +1,7 @@
 // The symbol dictionary (hashing, probing, a full table, definitions) and
 // the identifier life cycle on top of it: parse_ident, labels, dict_check.
+#include "dict/dictionary.h"
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -8,7 +10,6 @@
 #include <vector>
 
 #include "dict/declarations.h"
-#include "dict/dictionary.h"
 #include "lex/lexer.h"
 #include "lex_harness.h"
 
@@ -20,9 +21,13 @@ using tplex::test::LexSession;
 namespace tplex {
 namespace {
 
-const token_record &tok() { return current_token; }
+const token_record &tok() {
+    return current_token;
+}
 
-status_code lookup(std::string name) { return dict_lookup(name.data()); }
+status_code lookup(std::string name) {
+    return dict_lookup(name.data());
+}
 
 // The entry of a name as "kind:code", or "absent".
 std::string entry(const std::string &name) {
@@ -46,8 +51,14 @@ std::string name_at(int home, const char *prefix = "Q") {
 TEST(Dictionary, HashAndKeywordSlots) {
     LexSession s;
     for (const auto &[name, hash] : std::initializer_list<std::pair<const char *, int>>{
-             {"A", 0}, {"AB", 608}, {"<=", 128}, {"STATE", 444}, {"SEQUENCEVALIDITY", 1404},
-             {"$LAB-00001", 780}, {"", 0}, {"\xFF", static_cast<std::uint16_t>(-66 * 64) % 1664}})
+             {"A", 0},
+             {"AB", 608},
+             {"<=", 128},
+             {"STATE", 444},
+             {"SEQUENCEVALIDITY", 1404},
+             {"$LAB-00001", 780},
+             {"", 0},
+             {"\xFF", static_cast<std::uint16_t>(-66 * 64) % 1664}})
         EXPECT_EQ(dict_hash(name), hash) << name;
     // Keywords that share a home slot probe on to the next.
     for (const auto &[word, slot] : std::initializer_list<std::pair<const char *, int>>{
@@ -135,10 +146,12 @@ TEST(ParseIdent, TwoCountersNumberTheClasses) {
     ASSERT_EQ(s.open("a b c d e f g h i j k l m n o p q r s"), 1);
     int n = 1;  // the shared counter, from 1
     for (int c : {13, 19, 14, 15, 16, 26})
-        EXPECT_EQ(ident(1, static_cast<std::uint8_t>(c)), "0 " + std::to_string(c) + ":" + std::to_string(n++));
+        EXPECT_EQ(ident(1, static_cast<std::uint8_t>(c)),
+                  "0 " + std::to_string(c) + ":" + std::to_string(n++));
     n = 2;  // every other class on the general counter, from 2
     for (int c : {17, 27, 18, 20, 21, 22, 23, 24, 25, 200, 0})
-        EXPECT_EQ(ident(1, static_cast<std::uint8_t>(c)), "0 " + std::to_string(c) + ":" + std::to_string(n++));
+        EXPECT_EQ(ident(1, static_cast<std::uint8_t>(c)),
+                  "0 " + std::to_string(c) + ":" + std::to_string(n++));
     general_counter = 32767;
     EXPECT_EQ(ident(1, 17), "0 17:-32768");
     shared_class_counter = 65535;
@@ -167,7 +180,7 @@ TEST(ParseIdent, TokensThatAreNoIdentifier) {
     LexSession s;
     ASSERT_EQ(s.open("protocol 12 \"s\" + $ <\"p\"> 'c' 'd' #define D\nD D"), 1);
     for (int i = 0; i < 4; ++i) EXPECT_EQ(ident(1, 13), err(TPLEX_IDENTIFIER_EXPECTED)) << i;
-    EXPECT_EQ(ident(1, 13), err(TPLEX_BAD_CHARACTER));  // reading failures pass unchanged
+    EXPECT_EQ(ident(1, 13), err(TPLEX_BAD_CHARACTER));     // reading failures pass unchanged
     EXPECT_EQ(ident(1, 13), err(TPLEX_ALREADY_DECLARED));  // a PDF string: kind 33
     EXPECT_EQ(ident(0, 13), err(TPLEX_TYPE_MISMATCH));     // a character: kind 34
     EXPECT_EQ(ident(0, 34).substr(0, 5), "0 34:");

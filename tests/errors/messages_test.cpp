@@ -54,13 +54,18 @@ protected:
 
 TEST_F(Messages, ListedAndUnlistedCodes) {
     EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_main("Bad Character"));
-    EXPECT_EQ(display(TPLEX_FIELD_NOT_PRESENT), at_main("Not an allowed field not present statement"));
+    EXPECT_EQ(display(TPLEX_FIELD_NOT_PRESENT),
+              at_main("Not an allowed field not present statement"));
     EXPECT_EQ(display(TPLEX_CLOSE_FAILED), heading + "Error Closing File\n");
     EXPECT_EQ(get(TPLEX_GENERAL_FAILURE), "General Failure Code");
     for (const auto &[code, text] : std::initializer_list<std::pair<status_code, const char *>>{
-             {TPLEX_STATUS(0xD3470231u), "d3470231"}, {TPLEX_STATUS(0xD3470233u), "d3470233"},
-             {TPLEX_STATUS(0xD3470200u), "d3470200"}, {0, "0"}, {7, "7"},
-             {TPLEX_OUT_TOO_MANY_REFERENCES, "d347000b"}, {TPLEX_ALREADY_DEFINED, "d3431001"}}) {
+             {TPLEX_STATUS(0xD3470231u), "d3470231"},
+             {TPLEX_STATUS(0xD3470233u), "d3470233"},
+             {TPLEX_STATUS(0xD3470200u), "d3470200"},
+             {0, "0"},
+             {7, "7"},
+             {TPLEX_OUT_TOO_MANY_REFERENCES, "d347000b"},
+             {TPLEX_ALREADY_DEFINED, "d3431001"}}) {
         EXPECT_EQ(display(code), at_main(std::string("unspecified error: ") + text));
         EXPECT_EQ(get(code), confused);
     }

@@ -1,5 +1,7 @@
 // The lexer's state: initialisation, reset between passes, release, and the
 // exports called before there is any state.
+#include "lex/lexer.h"
+
 #include <gtest/gtest.h>
 
 #include <string>
@@ -7,7 +9,6 @@
 #include "dict/declarations.h"
 #include "dict/dictionary.h"
 #include "lex/keywords.h"
-#include "lex/lexer.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
 #include "source/source_stack.h"

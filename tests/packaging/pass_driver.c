@@ -24,7 +24,8 @@
 #define chdir _chdir
 #define rmdir _rmdir
 #define make_dir(name) _mkdir(name)
-#define open_capture(name) _open(name, _O_CREAT | _O_TRUNC | _O_RDWR | _O_BINARY, _S_IREAD | _S_IWRITE)
+#define open_capture(name) \
+    _open(name, _O_CREAT | _O_TRUNC | _O_RDWR | _O_BINARY, _S_IREAD | _S_IWRITE)
 #define PART_INC "sub\\part.inc"
 #else
 #define _POSIX_C_SOURCE 200809L
@@ -68,8 +69,8 @@ static void(TPLEX_CALL *p_back_token)(void);
 static status_code(TPLEX_CALL *p_open_source_file)(const char *);
 static status_code(TPLEX_CALL *p_rewind_input)(void);
 static status_code(TPLEX_CALL *p_parse_ident)(uint8_t, uint8_t);
-static status_code(TPLEX_CALL *p_dict_extend)(const char *, const char *, const char *, uint8_t, uint8_t,
-                                              uint8_t);
+static status_code(TPLEX_CALL *p_dict_extend)(const char *, const char *, const char *, uint8_t,
+                                              uint8_t, uint8_t);
 static status_code(TPLEX_CALL *p_dict_check)(void);
 static void(TPLEX_CALL *p_sg_DisplayError)(status_code);
 static const char *(TPLEX_CALL *p_sg_GetError)(status_code);
@@ -179,7 +180,8 @@ static void pass(int first) {
 
     /* The include, by a relative backslash path; the rest of its line unread. */
     CHECK(is(p_sc_next_token(), tk_reserved_word, 2, "STATE") && *depth == 2);
-    CHECK(strcmp(frames[2].path, "sub\\part.inc") == 0 && strcmp(frames[2].line_text, "STATE 7\n") == 0);
+    CHECK(strcmp(frames[2].path, "sub\\part.inc") == 0 &&
+          strcmp(frames[2].line_text, "STATE 7\n") == 0);
     CHECK(is(p_sc_next_token(), tk_number, 7, "7"));
     CHECK(is(p_sc_next_token(), tk_reserved_word, 117, "WINDOW"));
     CHECK(*depth == 1 && frames[2].file == NULL && frames[1].line_no == 3);
@@ -196,8 +198,9 @@ static void pass(int first) {
     /* A diagnostic names the frame's path and line, as read. */
     capture_begin();
     p_sg_DisplayError(TPLEX_BAD_CHARACTER);
-    CHECK(strcmp(capture_end(), "\nTemplate compiler error :\nBad Character\n"
-                                "File: main.src    Line: 4\nwindow Foo LIMIT\n") == 0);
+    CHECK(strcmp(capture_end(),
+                 "\nTemplate compiler error :\nBad Character\n"
+                 "File: main.src    Line: 4\nwindow Foo LIMIT\n") == 0);
     /* A relative name with no include folders: refused, nothing pushed. */
     CHECK(p_open_source_file("missing.src") == TPLEX_NO_INCLUDE_DIRS && *depth == 1);
 
@@ -226,9 +229,10 @@ int main(int argc, char **argv) {
     /* A fresh working folder, as the compiler runs in the user's. */
     snprintf(dir, sizeof dir, "tplex-pass-%ld", (long)time(NULL) ^ (long)clock());
     if (make_dir(dir) != 0 || chdir(dir) != 0 || make_dir("sub") != 0 ||
-        !write_file("main.src", "#define LIMIT 3\r\nPROTOCOL foo 42 \"str\" <= 'c'\r\n"
-                                "#include \"sub\\part.inc\" EXTRA\r\nwindow Foo LIMIT\r\n"
-                                "#ifdef DEBUG\r\nTIMER\r\n#endif\r\n\x1A$?\\ \r\n") ||
+        !write_file("main.src",
+                    "#define LIMIT 3\r\nPROTOCOL foo 42 \"str\" <= 'c'\r\n"
+                    "#include \"sub\\part.inc\" EXTRA\r\nwindow Foo LIMIT\r\n"
+                    "#ifdef DEBUG\r\nTIMER\r\n#endif\r\n\x1A$?\\ \r\n") ||
         !write_file(PART_INC, "STATE 7\r\n")) {
         printf("cannot prepare the working folder %s\n", dir);
         return 1;
@@ -246,7 +250,8 @@ int main(int argc, char **argv) {
     CHECK(strcmp(words[39].word, "<=") == 0 && strcmp(words[117].word, "WINDOW") == 0);
     CHECK(words[117].word[2499] == 0);
     CHECK(*depth == 0 && *declare == 1);
-    for (i = 0; i < TPLEX_SOURCE_FRAMES; ++i) CHECK(frames[i].file == NULL && frames[i].path[0] == 0);
+    for (i = 0; i < TPLEX_SOURCE_FRAMES; ++i)
+        CHECK(frames[i].file == NULL && frames[i].path[0] == 0);
 
     names[0] = debug;
     names[1] = trace;
@@ -256,7 +261,8 @@ int main(int argc, char **argv) {
     pass(1);
     capture_begin();
     CHECK(p_dict_check() == TPLEX_UNDECLARED_IDENTIFIER);
-    CHECK(strcmp(capture_end(), "\nUndeclared Identifier: FOO\nNumber of Undeclared Identifiers = 1") == 0);
+    CHECK(strcmp(capture_end(),
+                 "\nUndeclared Identifier: FOO\nNumber of Undeclared Identifiers = 1") == 0);
 
     /* A further pass from the same main file, with a fresh dictionary. */
     CHECK(p_rewind_input() == 1);

@@ -35,7 +35,8 @@ void walk_failures(const std::function<void()> &setup, const std::function<void(
                    const std::function<void(unsigned long)> &check) {
     const unsigned long total = allocations_of(setup, step);
     ASSERT_GT(total, 0u);
-    const ::testing::TestResult &result = *::testing::UnitTest::GetInstance()->current_test_info()->result();
+    const ::testing::TestResult &result =
+        *::testing::UnitTest::GetInstance()->current_test_info()->result();
     for (unsigned long n = 1; n <= total; ++n) {
         const int parts = result.total_part_count();
         setup();
@@ -285,7 +286,9 @@ TEST(AllocFailure, InitDefines) {
 
 namespace {
 
-bool file_exists(const std::string &path) { return std::ifstream(path).good(); }
+bool file_exists(const std::string &path) {
+    return std::ifstream(path).good();
+}
 
 TEST(AllocFailure, OpenOutput) {
     TempDir dir;
@@ -331,12 +334,13 @@ void check_inside_output(const char *what, const std::function<int32_t()> &op, i
 TEST(AllocFailure, InsideOutput) {
     uint32_t id = 0;
     const std::string long_text(9999, 's');
-    check_inside_output("WriteReference", [&] { return WriteReference(&id, 0); },
-                        TPLEX_OUT_NO_MEMORY_RELOC);
-    check_inside_output("StoreString", [] { return StoreString("x"); }, TPLEX_OUT_NO_MEMORY_RELOC);
-    check_inside_output("AddToStringStore, new chunk",
-                        [&] { return AddToStringStore(&id, long_text.c_str()); },
-                        TPLEX_OUT_NO_MEMORY_CHUNK);
+    check_inside_output(
+        "WriteReference", [&] { return WriteReference(&id, 0); }, TPLEX_OUT_NO_MEMORY_RELOC);
+    check_inside_output(
+        "StoreString", [] { return StoreString("x"); }, TPLEX_OUT_NO_MEMORY_RELOC);
+    check_inside_output(
+        "AddToStringStore, new chunk", [&] { return AddToStringStore(&id, long_text.c_str()); },
+        TPLEX_OUT_NO_MEMORY_CHUNK);
 }
 
 // Memory output: a first chunk that cannot be had leaves memory output off

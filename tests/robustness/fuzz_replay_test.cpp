@@ -24,7 +24,7 @@ namespace fs = std::filesystem;
 std::vector<std::string> inputs_of(const std::string &target) {
     std::vector<std::string> files;
     for (const fs::path &dir : {fs::path(TPLEX_SOURCE_DIR) / "tests/robustness/crashes" / target,
-                               fs::path(TPLEX_SOURCE_DIR) / "fuzz/corpus" / target}) {
+                                fs::path(TPLEX_SOURCE_DIR) / "fuzz/corpus" / target}) {
         std::error_code ec;
         for (const auto &e : fs::directory_iterator(dir, ec))
             if (e.is_regular_file()) files.push_back(e.path().string());
@@ -41,8 +41,8 @@ std::string read_file(const std::string &path) {
 // "crashes/lexer/hang-x" becomes crashes_hang_x.
 std::string case_name(const ::testing::TestParamInfo<std::string> &info) {
     const fs::path p(info.param);
-    std::string name = p.parent_path().parent_path().filename().string() + "_" +
-                       p.filename().string();
+    std::string name =
+        p.parent_path().parent_path().filename().string() + "_" + p.filename().string();
     for (char &c : name)
         if (!std::isalnum(static_cast<unsigned char>(c))) c = '_';
     return name;
@@ -59,10 +59,18 @@ class TableOutputReplay : public ::testing::TestWithParam<std::string> {};
 class TableCheckReplay : public ::testing::TestWithParam<std::string> {};
 class FileNamesReplay : public ::testing::TestWithParam<std::string> {};
 
-TEST_P(LexerReplay, RunsClean) { replay(tplex::fuzz::run_lexer, GetParam()); }
-TEST_P(TableOutputReplay, RunsClean) { replay(tplex::fuzz::run_table_output, GetParam()); }
-TEST_P(TableCheckReplay, RunsClean) { replay(tplex::fuzz::run_table_check, GetParam()); }
-TEST_P(FileNamesReplay, RunsClean) { replay(tplex::fuzz::run_file_names, GetParam()); }
+TEST_P(LexerReplay, RunsClean) {
+    replay(tplex::fuzz::run_lexer, GetParam());
+}
+TEST_P(TableOutputReplay, RunsClean) {
+    replay(tplex::fuzz::run_table_output, GetParam());
+}
+TEST_P(TableCheckReplay, RunsClean) {
+    replay(tplex::fuzz::run_table_check, GetParam());
+}
+TEST_P(FileNamesReplay, RunsClean) {
+    replay(tplex::fuzz::run_file_names, GetParam());
+}
 
 INSTANTIATE_TEST_SUITE_P(Inputs, LexerReplay, ::testing::ValuesIn(inputs_of("lexer")), case_name);
 INSTANTIATE_TEST_SUITE_P(Inputs, TableOutputReplay, ::testing::ValuesIn(inputs_of("table_output")),

@@ -134,7 +134,7 @@ void table_outputs(const std::string &dir, int round) {
     EXPECT_FALSE(std::filesystem::exists(dropped));
 
     ASSERT_EQ(OpenOutput(dropped.c_str(), 0, 0), 0);
-    EXPECT_EQ(WriteReference(&id, 0), 0);                       // never defined
+    EXPECT_EQ(WriteReference(&id, 0), 0);  // never defined
     EXPECT_EQ(CloseOutput(), TPLEX_OUT_UNDEFINED_REFERENCE);
     EXPECT_EQ(AbandonOutput(0), 0);
     EXPECT_FALSE(std::filesystem::exists(dropped));

@@ -1,16 +1,16 @@
 // The dictionary listing, byte for byte, with its key-press pauses fed from
 // a file on standard input.
+#include "scan/listing.h"
+
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <string>
 
-#include <unistd.h>
-
 #include "dict/dictionary.h"
 #include "lex/lexer.h"
 #include "lex_harness.h"
-#include "scan/listing.h"
 
 using tplex::test::CaptureStdout;
 using tplex::test::LexSession;
@@ -22,7 +22,8 @@ namespace {
 class StdinFrom {
 public:
     explicit StdinFrom(const std::string &bytes) : saved_(dup(0)) {
-        if (std::freopen(dir_.write("stdin", bytes).c_str(), "r", stdin) == nullptr) ADD_FAILURE() << "freopen";
+        if (std::freopen(dir_.write("stdin", bytes).c_str(), "r", stdin) == nullptr)
+            ADD_FAILURE() << "freopen";
     }
     ~StdinFrom() {
         dup2(saved_, 0);
@@ -39,10 +40,11 @@ private:
 // entry, "Press a key" after the 9th, 19th, 29th... line.
 std::string expected_listing(bool all, int &pauses) {
     static const char *const names[35] = {
-        nullptr, nullptr, "String", nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, "Reserved Word",
-        "Identifier", nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr,
-        nullptr, nullptr, nullptr, nullptr, "Hash Word", "Hash Definition", nullptr, nullptr, nullptr,
-        nullptr, nullptr, nullptr, nullptr, "PDF String", "Char"};
+        nullptr, nullptr, "String",        nullptr,      nullptr,           nullptr,      nullptr,
+        nullptr, nullptr, "Reserved Word", "Identifier", nullptr,           nullptr,      nullptr,
+        nullptr, nullptr, nullptr,         nullptr,      nullptr,           nullptr,      nullptr,
+        nullptr, nullptr, nullptr,         "Hash Word",  "Hash Definition", nullptr,      nullptr,
+        nullptr, nullptr, nullptr,         nullptr,      nullptr,           "PDF String", "Char"};
     std::string out;
     int line = 1;
     pauses = 0;
@@ -78,7 +80,8 @@ TEST(Listing, EveryKeyword) {
 }
 
 TEST(Listing, PausesAfterTheNinthLineOfTen) {
-    for (const auto &[names, pauses] : std::initializer_list<std::pair<int, int>>{{8, 0}, {9, 1}, {19, 2}, {29, 3}}) {
+    for (const auto &[names, pauses] :
+         std::initializer_list<std::pair<int, int>>{{8, 0}, {9, 1}, {19, 2}, {29, 3}}) {
         LexSession s;
         for (int i = 0; i < names; ++i) {
             std::string name = "N" + std::to_string(i);
@@ -88,7 +91,8 @@ TEST(Listing, PausesAfterTheNinthLineOfTen) {
         int counted = 0;
         const std::string expected = expected_listing(false, counted);
         EXPECT_EQ(counted, pauses);
-        EXPECT_EQ(listing(0, std::string(static_cast<std::size_t>(pauses), 'k')), expected) << names;
+        EXPECT_EQ(listing(0, std::string(static_cast<std::size_t>(pauses), 'k')), expected)
+            << names;
         EXPECT_EQ(listing(0, ""), expected) << "the end of input ends a wait";
     }
 }
@@ -118,8 +122,8 @@ TEST(Listing, EveryKindHasItsName) {
     }
     int pauses = 0;
     const std::string expected = expected_listing(true, pauses);
-    for (const char *n : {"String", "Unknown", "Reserved Word", "Identifier", "Hash Word", "Hash Definition",
-                          "PDF String", "Char"})
+    for (const char *n : {"String", "Unknown", "Reserved Word", "Identifier", "Hash Word",
+                          "Hash Definition", "PDF String", "Char"})
         EXPECT_NE(expected.find(n), std::string::npos) << n;
     EXPECT_EQ(listing(1, "k"), expected);
 }

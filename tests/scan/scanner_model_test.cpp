@@ -68,8 +68,10 @@ struct Model {
             }
             if (c == '\r') {
                 const int next = std::getc(f.f);
-                if (next == '\n') c = '\n';
-                else if (next != EOF) std::ungetc(next, f.f);
+                if (next == '\n')
+                    c = '\n';
+                else if (next != EOF)
+                    std::ungetc(next, f.f);
             }
             f.line[n++] = static_cast<char>(c);
             if (c == '\n') break;
@@ -82,7 +84,8 @@ struct Model {
         while (!bodies.empty() && bodies.back().pos > bodies.back().text.size()) bodies.pop_back();
         if (!bodies.empty()) {
             Body &b = bodies.back();
-            return b.pos < b.text.size() ? static_cast<unsigned char>(b.text[b.pos++]) : (++b.pos, 0);
+            return b.pos < b.text.size() ? static_cast<unsigned char>(b.text[b.pos++])
+                                         : (++b.pos, 0);
         }
         if (files.empty()) return 255;
         File *f = &files.back();
@@ -163,14 +166,20 @@ struct Model {
         while (result == 0 && !complete) {
             const int c = next_char();
             if (c == '"') {
-                if (peek_char() == '"') next_char();
-                else if (!pdf) complete = true;
-                else if (peek_char() == '>') next_char(), complete = true;
-                else result = TPLEX_BAD_PDF_STRING;
+                if (peek_char() == '"')
+                    next_char();
+                else if (!pdf)
+                    complete = true;
+                else if (peek_char() == '>')
+                    next_char(), complete = true;
+                else
+                    result = TPLEX_BAD_PDF_STRING;
             }
             if (complete || result != 0) break;
-            if (c == 0 || c == 255) result = TPLEX_END_OF_LINE_IN_STRING;
-            else if (rec.text.size() < 2499) rec.text.push_back(static_cast<char>(c));
+            if (c == 0 || c == 255)
+                result = TPLEX_END_OF_LINE_IN_STRING;
+            else if (rec.text.size() < 2499)
+                rec.text.push_back(static_cast<char>(c));
         }
         rec.kind = pdf ? 33 : 2;
         return complete ? rec.kind : result;
@@ -214,9 +223,12 @@ struct Model {
                 rec.text = std::string(1, static_cast<char>(c));
                 word_rest();
                 if (word_lookup() != 1) rec.kind = 10;
-                if (rec.kind != 4) result = rec.kind;
-                else if (bodies.size() == 20) result = TPLEX_TOO_MANY_MACRO_LEVELS;
-                else bodies.push_back(Body{rec.def1.substr(0, 2499), 0});
+                if (rec.kind != 4)
+                    result = rec.kind;
+                else if (bodies.size() == 20)
+                    result = TPLEX_TOO_MANY_MACRO_LEVELS;
+                else
+                    bodies.push_back(Body{rec.def1.substr(0, 2499), 0});
                 continue;
             }
             if (digit(c)) {
@@ -224,12 +236,28 @@ struct Model {
                 continue;
             }
             switch (c) {
-                case 0: case '\n': result = 36; break;
-                case ' ': case '\t': break;
-                case 251: do c = next_char(); while (c != 252 && c != 0 && c != 255); break;
-                case 253: do c = next_char(); while (c != '\n' && c != 0 && c != 255); break;
-                case 255: rec.kind = 5; result = 5; break;
-                case '"': result = literal(false); break;
+                case 0:
+                case '\n':
+                    result = 36;
+                    break;
+                case ' ':
+                case '\t':
+                    break;
+                case 251:
+                    do c = next_char();
+                    while (c != 252 && c != 0 && c != 255);
+                    break;
+                case 253:
+                    do c = next_char();
+                    while (c != '\n' && c != 0 && c != 255);
+                    break;
+                case 255:
+                    rec.kind = 5;
+                    result = 5;
+                    break;
+                case '"':
+                    result = literal(false);
+                    break;
                 case '\'':
                     c = next_char();
                     if (c == 0 || c == 255) {
@@ -251,36 +279,71 @@ struct Model {
                     }
                     break;
                 case '-':
-                    if (digit(peek_char())) negative = true;
-                    else result = op('-');
+                    if (digit(peek_char()))
+                        negative = true;
+                    else
+                        result = op('-');
                     break;
                 case '<': {
                     const int p = peek_char();
-                    if (p == '=') next_char(), result = op(5);
-                    else if (p == '<') next_char(), result = op(7);
-                    else if (p == '"') next_char(), result = literal(true);
-                    else result = op('<');
+                    if (p == '=')
+                        next_char(), result = op(5);
+                    else if (p == '<')
+                        next_char(), result = op(7);
+                    else if (p == '"')
+                        next_char(), result = literal(true);
+                    else
+                        result = op('<');
                     break;
                 }
                 case '>': {
                     const int p = peek_char();
-                    if (p == '=') next_char(), result = op(6);
-                    else if (p == '>') next_char(), result = op(8);
-                    else result = op('>');
+                    if (p == '=')
+                        next_char(), result = op(6);
+                    else if (p == '>')
+                        next_char(), result = op(8);
+                    else
+                        result = op('>');
                     break;
                 }
-                case '!': case '&': case '.': case '/': case '^': case '|': {
+                case '!':
+                case '&':
+                case '.':
+                case '/':
+                case '^':
+                case '|': {
                     const int second = (c == '!' || c == '/') ? '=' : c;
-                    const int pair = c == '!' ? 11 : c == '&' ? 4 : c == '.' ? 9 : c == '/' ? 2 : c == '^' ? 10 : 3;
-                    if (peek_char() == second) next_char(), result = op(pair);
-                    else result = op(c);
+                    const int pair = c == '!'   ? 11
+                                     : c == '&' ? 4
+                                     : c == '.' ? 9
+                                     : c == '/' ? 2
+                                     : c == '^' ? 10
+                                                : 3;
+                    if (peek_char() == second)
+                        next_char(), result = op(pair);
+                    else
+                        result = op(c);
                     break;
                 }
-                case '%': case '(': case ')': case '*': case '+': case ',': case ':': case ';':
-                case '=': case '[': case ']': case '{': case '}': case '~':
+                case '%':
+                case '(':
+                case ')':
+                case '*':
+                case '+':
+                case ',':
+                case ':':
+                case ';':
+                case '=':
+                case '[':
+                case ']':
+                case '{':
+                case '}':
+                case '~':
                     result = op(c);
                     break;
-                default: result = TPLEX_BAD_CHARACTER; break;
+                default:
+                    result = TPLEX_BAD_CHARACTER;
+                    break;
             }
         }
         return result;
@@ -298,7 +361,8 @@ struct Model {
             if (!live()) return 36;
             if (lookup(name) == 1) return TPLEX_UNEXPECTED_HASH_WORD;
             if (name_kind == 10) {
-                if (tplex::dict_insert(25, 0, name.c_str()) == 0) rec = Record{25, 0, name.substr(0, 128), rec.def1};
+                if (tplex::dict_insert(25, 0, name.c_str()) == 0)
+                    rec = Record{25, 0, name.substr(0, 128), rec.def1};
                 return 36;
             }
             return name_kind != 25 ? TPLEX_BAD_HASH_WORD : 36;
@@ -311,9 +375,18 @@ struct Model {
         while ((last = scan()) != 36 && last != 5) {
             if (body.size() + rec.text.size() + 2 >= 2500) return TPLEX_MACRO_TOO_LONG;
             switch (rec.kind) {
-                case 1: case 2: case 9: case 10: case 33: body += rec.text; break;
-                case 3: body.push_back(static_cast<char>(rec.value & 0xFF)); break;
-                default: return TPLEX_MACRO_BAD_TOKEN;
+                case 1:
+                case 2:
+                case 9:
+                case 10:
+                case 33:
+                    body += rec.text;
+                    break;
+                case 3:
+                    body.push_back(static_cast<char>(rec.value & 0xFF));
+                    break;
+                default:
+                    return TPLEX_MACRO_BAD_TOKEN;
             }
             body += " ";
         }
@@ -328,15 +401,20 @@ struct Model {
     std::int32_t directive() {
         std::int32_t result = 0;
         switch (rec.value) {
-            case 201: return define();
-            case 202: case 203: {
+            case 201:
+                return define();
+            case 202:
+            case 203: {
                 const bool want_defined = rec.value == 202;
                 std::uint8_t flag = 0;
                 result = scan();
                 if (live()) {
-                    if (rec.kind == 10) flag = want_defined ? 0 : 1;
-                    else if (rec.kind == 25) flag = want_defined ? 1 : 0;
-                    else result = TPLEX_BAD_HASH_WORD;
+                    if (rec.kind == 10)
+                        flag = want_defined ? 0 : 1;
+                    else if (rec.kind == 25)
+                        flag = want_defined ? 1 : 0;
+                    else
+                        result = TPLEX_BAD_HASH_WORD;
                 }
                 if (depth >= 20) return TPLEX_TOO_MANY_COND_LEVELS;
                 flags[++depth] = flag;
@@ -346,7 +424,8 @@ struct Model {
                 if (depth == 0) return TPLEX_EXTRA_ENDIF;
                 --depth;
                 return 0;
-            default: return TPLEX_UNEXPECTED_HASH_WORD;
+            default:
+                return TPLEX_UNEXPECTED_HASH_WORD;
         }
     }
 
@@ -366,16 +445,82 @@ struct Model {
 // ------------------------------------------------------------ inputs
 
 const std::vector<std::string> token_pieces = {
-    "a", "b", "Zq", "x_1", "m1", "M2", "m3", "protocol", "define", "0", "7", "12", "0x", "0X1f", "0b",
-    "0b10", "ff", "-", "- ", "-5", "+", "*", "/", "<", ">", "=", "!", "&", "|", "^", ".", "%", ",",
-    ";", "(", "]", "~", "\"", "\"\"", "<\"", "\">", "'", "''", "/*", "*/", "//", "\n", "\n", " ",
-    "  ", "\t", "#", "#endif", "#foo", "$", "?", "\r", "\xfb", "\xfc", "\xfd", "\xff", "\xfe", "\x80",
-    "9999999999", "abcdefghij", ">=", ">>", std::string(1, '\0'), std::string(130, 'w'), std::string(300, 'w'),
+    "a",
+    "b",
+    "Zq",
+    "x_1",
+    "m1",
+    "M2",
+    "m3",
+    "protocol",
+    "define",
+    "0",
+    "7",
+    "12",
+    "0x",
+    "0X1f",
+    "0b",
+    "0b10",
+    "ff",
+    "-",
+    "- ",
+    "-5",
+    "+",
+    "*",
+    "/",
+    "<",
+    ">",
+    "=",
+    "!",
+    "&",
+    "|",
+    "^",
+    ".",
+    "%",
+    ",",
+    ";",
+    "(",
+    "]",
+    "~",
+    "\"",
+    "\"\"",
+    "<\"",
+    "\">",
+    "'",
+    "''",
+    "/*",
+    "*/",
+    "//",
+    "\n",
+    "\n",
+    " ",
+    "  ",
+    "\t",
+    "#",
+    "#endif",
+    "#foo",
+    "$",
+    "?",
+    "\r",
+    "\xfb",
+    "\xfc",
+    "\xfd",
+    "\xff",
+    "\xfe",
+    "\x80",
+    "9999999999",
+    "abcdefghij",
+    ">=",
+    ">>",
+    std::string(1, '\0'),
+    std::string(130, 'w'),
+    std::string(300, 'w'),
 };
 const std::vector<std::string> directive_pieces = {
-    "#define ", "define ", "#ifdef ", "#ifndef ", "#endif", "endif ", "ifdef ", "k1", "k2", "K3", "m1", "M2",
-    "5", "0x1", "\"s\"", "\"\"", "<\"p\">", "'c'", "+", "<=", "-", "-1", "protocol", "\n", "\n", "\n", " ",
-    " ", "//", "/*", "*/", "$", "12ab", "#foo", "\xff",
+    "#define ", "define ", "#ifdef ", "#ifndef ", "#endif",   "endif ", "ifdef ", "k1",      "k2",
+    "K3",       "m1",      "M2",      "5",        "0x1",      "\"s\"",  "\"\"",   "<\"p\">", "'c'",
+    "+",        "<=",      "-",       "-1",       "protocol", "\n",     "\n",     "\n",      " ",
+    " ",        "//",      "/*",      "*/",       "$",        "12ab",   "#foo",   "\xff",
 };
 
 std::string random_text(std::mt19937 &rng, const std::vector<std::string> &pieces, int max_pieces) {
@@ -386,7 +531,7 @@ std::string random_text(std::mt19937 &rng, const std::vector<std::string> &piece
 }
 
 struct Case {
-    std::string main, inner;          // inner: opened on top of main when with_inner
+    std::string main, inner;  // inner: opened on top of main when with_inner
     bool with_inner = false;
     std::vector<std::string> bodies;  // bodies of M1, M2, M3 (kind 4)
     int pad = 0;                      // blanks before the main text, to reach the 4999 edge
@@ -404,7 +549,8 @@ void define_bodies(const Case &c) {
 
 std::string show(std::int32_t r, std::uint16_t kind, std::int32_t value, const std::string &text) {
     char buf[64];
-    std::snprintf(buf, sizeof buf, "r=%x kind=%u value=%d text=", static_cast<unsigned>(r), kind, value);
+    std::snprintf(buf, sizeof buf, "r=%x kind=%u value=%d text=", static_cast<unsigned>(r), kind,
+                  value);
     std::string out = buf;
     for (unsigned char ch : text) {
         if (ch >= 32 && ch < 127) {
@@ -421,7 +567,8 @@ std::string show(std::int32_t r, std::uint16_t kind, std::int32_t value, const s
 // difference of the two traces (and of the final region depth) fails it.
 void check(const Case &c, const std::string &label) {
     TempDir dir;
-    std::vector<std::string> paths{dir.write("main.src", std::string(static_cast<std::size_t>(c.pad), ' ') + c.main)};
+    std::vector<std::string> paths{
+        dir.write("main.src", std::string(static_cast<std::size_t>(c.pad), ' ') + c.main)};
     if (c.with_inner) paths.push_back(dir.write("inner.src", c.inner));
     std::vector<std::string> model, real;
     int model_depth = 0;
@@ -454,9 +601,10 @@ void check(const Case &c, const std::string &label) {
     std::size_t i = 0;
     while (i < model.size() && i < real.size() && model[i] == real[i]) ++i;
     if (i == model.size() && i == real.size()) return;
-    ADD_FAILURE() << label << ": first difference at call " << i << "\n  model: "
-                  << (i < model.size() ? model[i] : "(none)") << "\n  real:  "
-                  << (i < real.size() ? real[i] : "(none)") << "\n  main: " << show(0, 0, 0, c.main)
+    ADD_FAILURE() << label << ": first difference at call " << i
+                  << "\n  model: " << (i < model.size() ? model[i] : "(none)")
+                  << "\n  real:  " << (i < real.size() ? real[i] : "(none)")
+                  << "\n  main: " << show(0, 0, 0, c.main)
                   << "\n  inner: " << show(0, 0, 0, c.inner);
 }
 
@@ -467,7 +615,8 @@ TEST(ScannerModel, GeneratedInputs) {
         c.main = random_text(rng, token_pieces, 40);
         c.with_inner = rng() % 3 == 0;
         if (c.with_inner) c.inner = random_text(rng, token_pieces, 15);
-        for (int b = static_cast<int>(rng() % 4); b > 0; --b) c.bodies.push_back(random_text(rng, token_pieces, 8));
+        for (int b = static_cast<int>(rng() % 4); b > 0; --b)
+            c.bodies.push_back(random_text(rng, token_pieces, 8));
         check(c, "case " + std::to_string(n));
     }
 }
@@ -478,7 +627,8 @@ TEST(ScannerModel, AtTheEdgeOfA4999Piece) {
         Case c;
         c.pad = 4999 - static_cast<int>(rng() % 6);
         c.main = random_text(rng, token_pieces, 12);
-        for (int b = static_cast<int>(rng() % 3); b > 0; --b) c.bodies.push_back(random_text(rng, token_pieces, 6));
+        for (int b = static_cast<int>(rng() % 3); b > 0; --b)
+            c.bodies.push_back(random_text(rng, token_pieces, 6));
         check(c, "case " + std::to_string(n));
     }
 }

@@ -23,7 +23,9 @@ using tplex::test::Tokens;
 
 namespace {
 
-std::string rep(char c, std::size_t n) { return std::string(n, c); }
+std::string rep(char c, std::size_t n) {
+    return std::string(n, c);
+}
 
 // The dictionary entry of a name: "kind:code", "|" and the first definition
 // text if it has one; "absent" when the name is not there.
@@ -48,10 +50,12 @@ Tokens lex_files(std::vector<std::string> texts) {
     for (std::string &t : texts) {
         for (char i = '1'; i <= '9'; ++i) {
             const std::string path = s.dir().path() + "/f" + i + ".src";
-            for (std::size_t at; (at = t.find(std::string("@") + i)) != std::string::npos;) t.replace(at, 2, path);
+            for (std::size_t at; (at = t.find(std::string("@") + i)) != std::string::npos;)
+                t.replace(at, 2, path);
         }
     }
-    for (std::size_t i = 1; i < texts.size(); ++i) s.file("f" + std::to_string(i) + ".src", texts[i]);
+    for (std::size_t i = 1; i < texts.size(); ++i)
+        s.file("f" + std::to_string(i) + ".src", texts[i]);
     if (s.open(texts[0]) != 1) return {"open failed"};
     return LexSession::all_described();
 }
@@ -67,7 +71,8 @@ TEST(ScannerLimits, TwentyNestedNamesAreExpandedAndNoMore) {
     // M1 -> M2 -> ... -> M20 -> 7: twenty bodies pending at once.
     std::string text;
     for (int i = 0; i <= 20; ++i)
-        text += "#define M" + std::to_string(i) + " " + (i == 20 ? "7" : "M" + std::to_string(i + 1)) + "\n";
+        text += "#define M" + std::to_string(i) + " " +
+                (i == 20 ? "7" : "M" + std::to_string(i + 1)) + "\n";
     EXPECT_EQ(lex(text + "M1 M20"), (Tokens{"n:7:7", "n:7:7", "eof"}));
     EXPECT_EQ(lex(text + "M0 z"), (Tokens{err(TPLEX_TOO_MANY_MACRO_LEVELS), "id:Z", "eof"}));
 }
@@ -76,11 +81,13 @@ TEST(ScannerLimits, TwentyNestedRegionsAndNoMore) {
     std::string open20, close20;
     for (int i = 0; i < 20; ++i) open20 += "#ifndef N\n", close20 += "#endif\n";
     EXPECT_EQ(lex(open20 + "a\n" + close20 + "b"), (Tokens{"id:A", "id:B", "eof"}));
-    EXPECT_EQ(lex(open20 + "#ifndef N\na\n" + close20 + "#endif\nb"),
-              (Tokens{err(TPLEX_TOO_MANY_COND_LEVELS), "id:A", err(TPLEX_EXTRA_ENDIF), "id:B", "eof"}));
+    EXPECT_EQ(
+        lex(open20 + "#ifndef N\na\n" + close20 + "#endif\nb"),
+        (Tokens{err(TPLEX_TOO_MANY_COND_LEVELS), "id:A", err(TPLEX_EXTRA_ENDIF), "id:B", "eof"}));
     LexSession s;
     ASSERT_EQ(s.open(open20 + "#ifdef N\na\n"), 1);
-    EXPECT_EQ(LexSession::all_described(), (Tokens{err(TPLEX_TOO_MANY_COND_LEVELS), "id:A", "eof"}));
+    EXPECT_EQ(LexSession::all_described(),
+              (Tokens{err(TPLEX_TOO_MANY_COND_LEVELS), "id:A", "eof"}));
     EXPECT_EQ(tplex::cond_depth, 20);
 }
 
@@ -93,25 +100,32 @@ TEST(ScannerLimits, DefineBodyLengths) {
     EXPECT_EQ(lex(line + " " + rep('z', 10) + "\n").front(), err(TPLEX_MACRO_TOO_LONG));
     EXPECT_EQ(entry_after(line + " " + rep('z', 10) + "\n", "L"), "absent");
     // A first string is quoted: with its blank it must fit 2499.
-    EXPECT_EQ(entry_after("#define S \"" + rep('s', 2496) + "\"\n", "S"), "4:0|\"" + rep('s', 2496) + "\" ");
-    EXPECT_EQ(lex("#define S \"" + rep('s', 2497) + "\"\nS"), (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:S", "eof"}));
-    EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2498) + "\">\n", "P"), "4:0|" + rep('p', 2498) + " ");
-    EXPECT_EQ(lex("#define P <\"" + rep('p', 2499) + "\">\nP"), (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:P", "eof"}));
+    EXPECT_EQ(entry_after("#define S \"" + rep('s', 2496) + "\"\n", "S"),
+              "4:0|\"" + rep('s', 2496) + "\" ");
+    EXPECT_EQ(lex("#define S \"" + rep('s', 2497) + "\"\nS"),
+              (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:S", "eof"}));
+    EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2498) + "\">\n", "P"),
+              "4:0|" + rep('p', 2498) + " ");
+    EXPECT_EQ(lex("#define P <\"" + rep('p', 2499) + "\">\nP"),
+              (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:P", "eof"}));
 }
 
 TEST(Include, FilesAndTheLinesAroundThem) {
     // Nested files end into their includers' next lines; the rest of an
     // #include line is never read.
-    EXPECT_EQ(lex_files({"a\n#include \"@1\" NOTREAD\nb", "m1\n#include \"@2\" $ \"\nm2\n", "i1\ni2"}),
-              (Tokens{"id:A", "id:M1", "id:I1", "id:I2", "id:M2", "id:B", "eof"}));
+    EXPECT_EQ(
+        lex_files({"a\n#include \"@1\" NOTREAD\nb", "m1\n#include \"@2\" $ \"\nm2\n", "i1\ni2"}),
+        (Tokens{"id:A", "id:M1", "id:I1", "id:I2", "id:M2", "id:B", "eof"}));
     // A string and a word run on into the includer's next line.
-    EXPECT_EQ(lex_files({"#include \"@1\"\nxyz\" q", "\"abc"}), (Tokens{"s:abcxyz", "id:Q", "eof"}));
+    EXPECT_EQ(lex_files({"#include \"@1\"\nxyz\" q", "\"abc"}),
+              (Tokens{"s:abcxyz", "id:Q", "eof"}));
     EXPECT_EQ(lex_files({"#include \"@1\"\ncd", "ab"}), (Tokens{"id:AB", "id:CD", "eof"}));
     // So does a #define on the last line: the next line becomes its body.
     EXPECT_EQ(lex_files({"#include \"@1\"\n#ifdef DEBUG\nx\n#endif\ny", "#define DEBUG"}),
               (Tokens{"id:X", err(TPLEX_EXTRA_ENDIF), "id:Y", "eof"}));
     // Definitions and regions carry across files.
-    EXPECT_EQ(lex_files({"#include \"@1\"\nV\n#endif\nV", "#define V 42\n#ifdef NO\n"}), (Tokens{"n:42:42", "eof"}));
+    EXPECT_EQ(lex_files({"#include \"@1\"\nV\n#endif\nV", "#define V 42\n#ifdef NO\n"}),
+              (Tokens{"n:42:42", "eof"}));
     EXPECT_EQ(lex_files({"#ifdef NO\n#include \"@1\"\n#endif\nb", "x\n"}), (Tokens{"id:B", "eof"}));
     const Tokens missing = lex_files({"#include \"@9\" x\nb"});
     ASSERT_EQ(missing.size(), 4u);
@@ -120,8 +134,10 @@ TEST(Include, FilesAndTheLinesAroundThem) {
 }
 
 TEST(InitDefines, NamesAreDefinedInUpperCaseUntilAKnownOne) {
-    EXPECT_EQ(lex_with_defines("#ifdef TRACE\na\n#endif\nb", {"trace"}), (Tokens{"id:A", "id:B", "eof"}));
-    EXPECT_EQ(lex_with_defines("#define D 5\nD", {"d"}), (Tokens{err(TPLEX_MACRO_REDEFINED), "def:D:2", "eof"}));
+    EXPECT_EQ(lex_with_defines("#ifdef TRACE\na\n#endif\nb", {"trace"}),
+              (Tokens{"id:A", "id:B", "eof"}));
+    EXPECT_EQ(lex_with_defines("#define D 5\nD", {"d"}),
+              (Tokens{err(TPLEX_MACRO_REDEFINED), "def:D:2", "eof"}));
     LexSession s;
     char a[] = "a", b[] = "Trace", again[] = "A", c[] = "c", p[] = "protocol";
     char *names[] = {a, b, again, c};
@@ -158,7 +174,8 @@ TEST(Frames, ReadPositionAndLineAfterEachToken) {
     source_frame *frames = nullptr;
     sc_lex_setup(nullptr, &frames, nullptr, nullptr, nullptr);
     const std::vector<std::pair<std::string, int>> expected = {
-        {"id:ABC", 3}, {"id:DEF", 7}, {"id:" + rep('X', 128), 4998}, {"op:47", 4999}, {"op:42", 1}, {"id:Z", 1}};
+        {"id:ABC", 3},   {"id:DEF", 7}, {"id:" + rep('X', 128), 4998},
+        {"op:47", 4999}, {"op:42", 1},  {"id:Z", 1}};
     std::vector<unsigned> lines;
     for (const auto &[token, pos] : expected) {
         EXPECT_EQ(describe(LexSession::next()), token);
@@ -181,7 +198,8 @@ std::string parse(const std::string &text, std::uint8_t mode) {
 }
 
 TEST(ParseString, Modes) {
-    const std::string not_allowed = err(TPLEX_STRING_NOT_ALLOWED), expected = err(TPLEX_STRING_EXPECTED);
+    const std::string not_allowed = err(TPLEX_STRING_NOT_ALLOWED),
+                      expected = err(TPLEX_STRING_EXPECTED);
     EXPECT_EQ(parse("abc x", 1), "0|| id:ABC id:X eof");  // optional: anything else is given back
     EXPECT_EQ(parse("<\"p\"> x", 1), "0|| pdf:p id:X eof");
     EXPECT_EQ(parse("\"a b\" x", 1), "0|a b| id:X eof");

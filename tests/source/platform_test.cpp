@@ -58,11 +58,32 @@ Lines reference_lines(const std::string &bytes, std::size_t capacity) {
 
 TEST(TextMode, AgreesWithTheCharacterAtATimeReference) {
     const std::string x(block - 1, 'x');
-    std::vector<std::string> inputs = {
-        "a\nb\n", "a\r\nb\r\n", "a\rb\n", "a\r\r\n\r", "\n\n", "last", "", std::string("a\0b\n\0", 5),
-        "a\x1A" "b\n", "\x1A" "b\n", "a\n\x1A\nb\x1A", "a\r\x1A\n", "abcdef\n", "abc\r\nd",
-        x + "\r\ny\r\n", x + "\rz\n", x + "\r", x + "\r\x1A\n", x + "\x1A" "after", x + "y\x1A" "after",
-        x + "\r\n" + std::string(block - 2, 'w') + "\r\nend", std::string(3 * block + 17, 'l') + "\ntail"};
+    std::vector<std::string> inputs = {"a\nb\n",
+                                       "a\r\nb\r\n",
+                                       "a\rb\n",
+                                       "a\r\r\n\r",
+                                       "\n\n",
+                                       "last",
+                                       "",
+                                       std::string("a\0b\n\0", 5),
+                                       "a\x1A"
+                                       "b\n",
+                                       "\x1A"
+                                       "b\n",
+                                       "a\n\x1A\nb\x1A",
+                                       "a\r\x1A\n",
+                                       "abcdef\n",
+                                       "abc\r\nd",
+                                       x + "\r\ny\r\n",
+                                       x + "\rz\n",
+                                       x + "\r",
+                                       x + "\r\x1A\n",
+                                       x + "\x1A"
+                                           "after",
+                                       x + "y\x1A"
+                                           "after",
+                                       x + "\r\n" + std::string(block - 2, 'w') + "\r\nend",
+                                       std::string(3 * block + 17, 'l') + "\ntail"};
     std::mt19937 rng(20240611);
     for (int round = 0; round < 12; ++round) {
         std::string bytes(2 * block + rng() % block, 'a');
@@ -71,8 +92,10 @@ TEST(TextMode, AgreesWithTheCharacterAtATimeReference) {
         inputs.push_back(bytes);
     }
     for (std::size_t i = 0; i < inputs.size(); ++i)
-        for (std::size_t cap : {std::size_t{2}, std::size_t{4}, std::size_t{7}, std::size_t{5000}, 3 * block})
-            EXPECT_EQ(lines_of(inputs[i], cap), reference_lines(inputs[i], cap)) << "input " << i << ", capacity " << cap;
+        for (std::size_t cap :
+             {std::size_t{2}, std::size_t{4}, std::size_t{7}, std::size_t{5000}, 3 * block})
+            EXPECT_EQ(lines_of(inputs[i], cap), reference_lines(inputs[i], cap))
+                << "input " << i << ", capacity " << cap;
     EXPECT_EQ(lines_of("a\r\nb\r\n"), (Lines{"a\n", "b\n"}));  // the reference itself, spelled out
     EXPECT_EQ(lines_of("abc\r\nd", 4), (Lines{"abc", "\n", "d"}));
 }
@@ -81,7 +104,11 @@ TEST(TextMode, StreamsNotOpenedHereAndPaths) {
     test::TempDir tmp;
 #ifndef _WIN32
     // On Windows text mode belongs to the C runtime and is chosen at opening.
-    std::FILE *binary = std::fopen(tmp.write("b", "a\r\nb\rc\x1A" "d\n").c_str(), "rb");
+    std::FILE *binary = std::fopen(tmp.write("b",
+                                             "a\r\nb\rc\x1A"
+                                             "d\n")
+                                       .c_str(),
+                                   "rb");
     EXPECT_EQ(read_all(binary, 5000), (Lines{"a\n", "b\rc"}));
     std::fclose(binary);
 #endif

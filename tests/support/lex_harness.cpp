@@ -14,20 +14,32 @@ std::string describe(const Token &t) {
     if (t.result < 0) return err(t.result);
     const std::string v = std::to_string(t.value);
     switch (t.kind) {
-        case tk_number: return "n:" + v + ":" + t.text;
-        case tk_string: return "s:" + t.text;
-        case tk_operator: return "op:" + v;
-        case tk_end_of_input: return "eof";
-        case tk_reserved_word: return "rw:" + v;
-        case tk_new_identifier: return "id:" + t.text;
-        case tk_hash_definition: return "def:" + t.text + ":" + v;
-        case tk_pdf_string: return "pdf:" + t.text;
-        case tk_char: return "ch:" + t.text;
-        default: return "k" + std::to_string(t.kind) + ":" + v + ":" + t.text;
+        case tk_number:
+            return "n:" + v + ":" + t.text;
+        case tk_string:
+            return "s:" + t.text;
+        case tk_operator:
+            return "op:" + v;
+        case tk_end_of_input:
+            return "eof";
+        case tk_reserved_word:
+            return "rw:" + v;
+        case tk_new_identifier:
+            return "id:" + t.text;
+        case tk_hash_definition:
+            return "def:" + t.text + ":" + v;
+        case tk_pdf_string:
+            return "pdf:" + t.text;
+        case tk_char:
+            return "ch:" + t.text;
+        default:
+            return "k" + std::to_string(t.kind) + ":" + v + ":" + t.text;
     }
 }
 
-LexSession::LexSession() { sc_lex_init(); }
+LexSession::LexSession() {
+    sc_lex_init();
+}
 
 LexSession::~LexSession() {
     sg_closesources();
@@ -43,7 +55,8 @@ Token LexSession::next() {
 
 std::vector<Token> LexSession::all() {
     std::vector<Token> out;
-    while (out.size() < 20000 && (out.empty() || out.back().result != tk_end_of_input)) out.push_back(next());
+    while (out.size() < 20000 && (out.empty() || out.back().result != tk_end_of_input))
+        out.push_back(next());
     return out;
 }
 
@@ -63,6 +76,8 @@ Tokens lex_with_defines(const std::string &text, std::vector<std::string> names)
     return LexSession::all_described();
 }
 
-Tokens lex(const std::string &text) { return lex_with_defines(text, {}); }
+Tokens lex(const std::string &text) {
+    return lex_with_defines(text, {});
+}
 
 }  // namespace tplex::test

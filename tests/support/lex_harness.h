@@ -35,9 +35,13 @@ public:
     LexSession &operator=(const LexSession &) = delete;
 
     // Writes a file below the session's folder; returns its path.
-    std::string file(const std::string &name, const std::string &bytes) const { return dir_.write(name, bytes); }
+    std::string file(const std::string &name, const std::string &bytes) const {
+        return dir_.write(name, bytes);
+    }
     // Writes the main file and opens it with sc_lex_init_file.
-    status_code open(const std::string &bytes) const { return sc_lex_init_file(file("main.src", bytes).c_str()); }
+    status_code open(const std::string &bytes) const {
+        return sc_lex_init_file(file("main.src", bytes).c_str());
+    }
     static Token next();
     // sc_next_token up to the end of input (at most 20000 calls).
     static std::vector<Token> all();

@@ -1,12 +1,12 @@
 #include "test_support.h"
 
+#include <fcntl.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <stdexcept>
-
-#include <fcntl.h>
 #ifdef _WIN32
 #include <io.h>
 #include <sys/stat.h>
@@ -22,9 +22,15 @@ namespace {
 
 #ifdef _WIN32
 // The C runtime's names for the POSIX descriptor calls.
-int dup(int fd) { return _dup(fd); }
-int dup2(int from, int to) { return _dup2(from, to); }
-int close(int fd) { return _close(fd); }
+int dup(int fd) {
+    return _dup(fd);
+}
+int dup2(int from, int to) {
+    return _dup2(from, to);
+}
+int close(int fd) {
+    return _close(fd);
+}
 
 // _mktemp_s picks a name that does not exist yet; creating it can still
 // lose a race with another process, so try again a few times.
@@ -59,7 +65,9 @@ std::string make_temp_dir(std::string pattern) {
     return pattern;
 }
 
-int make_temp_file(std::string &name) { return mkstemp(name.data()); }
+int make_temp_file(std::string &name) {
+    return mkstemp(name.data());
+}
 #endif
 
 }  // namespace
@@ -96,7 +104,9 @@ CaptureStdout::CaptureStdout() {
     close(fd);
 }
 
-CaptureStdout::~CaptureStdout() { text(); }
+CaptureStdout::~CaptureStdout() {
+    text();
+}
 
 std::string CaptureStdout::text() {
     if (!done_) {

@@ -79,7 +79,9 @@ TEST_F(StreamTest, HexTextMatchesRawBytes) {
         char item[8];
         std::snprintf(item, sizeof item, " 0x%02x", raw[i]);
         // The line break is the host's text mode's: CR LF on Windows.
-        expected += (i == 0 ? "" : i % 16 == 0 ? "," + std::string(host_line_end) : ",") +
+        expected += (i == 0        ? ""
+                     : i % 16 == 0 ? "," + std::string(host_line_end)
+                                   : ",") +
                     std::string(item);
     }
     EXPECT_EQ(text, expected);

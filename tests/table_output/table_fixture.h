@@ -14,8 +14,8 @@
 #include <vector>
 
 #include "lex/memory.h"
-#include "table_output/table_check.h"
 #include "table_output/references.h"
+#include "table_output/table_check.h"
 #include "test_support.h"
 #include "tplex/table_output.h"
 

@@ -19,8 +19,7 @@ bool write_table(const std::string &path, std::uint32_t flags) {
     return OpenOutput(path.c_str(), flags, 7) == 0 && WriteUInt32(0x11223344u) == 0 &&
            WriteReference(&forward, 0) == 0 && StoreString("PROTOCOL Signalling") == 0 &&
            WriteUInt8(1) == 0 && DefineReferenceHere(&defined, forward, 1) == 0 &&
-           WriteUInt16(0xBEEF) == 0 && StoreString("call control") == 0 &&
-           CloseOutput() == 0;
+           WriteUInt16(0xBEEF) == 0 && StoreString("call control") == 0 && CloseOutput() == 0;
 }
 
 }  // namespace

@@ -2,7 +2,6 @@
  * Linked with the static archive (TPLEX_STATIC), it also calls into the
  * table output module, which only the archive carries. */
 #include <stdio.h>
-
 #include <tplex/lexer.h>
 #include <tplex/table_output.h>
 
