@@ -46,7 +46,7 @@ void run_file_names(const std::uint8_t *data, std::size_t size) {
     std::memset(f, 0x7F, sizeof *f);
     split_file_spec(path.data(), ext.data(), f);
     check_fits(*f);
-    // The specification only ever loses its directory.
+    // The path only ever loses its directory.
     const std::size_t kept = std::strlen(path.data());
     TPLEX_FUZZ_CHECK(kept <= original.size(), kept);
     TPLEX_FUZZ_CHECK(original.compare(original.size() - kept, kept, path.data()) == 0, kept);

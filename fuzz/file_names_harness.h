@@ -1,8 +1,7 @@
-// The file name rules harness. Input: a file specification, byte 0x1E, an
-// expected extension, byte 0x1E, a default name. The specification is
-// split, the marker replaced and the result validated; every part must fit
-// its field, and a specification found valid must keep to the limits and
-// character sets.
+// The file name rules harness. Input: a file path, byte 0x1E, an expected
+// extension, byte 0x1E, a default name. The path is split, the marker
+// replaced and the result validated; every part must fit its field, and a
+// path found valid must keep to the limits and character sets.
 #ifndef TPLEX_FUZZ_FILE_NAMES_HARNESS_H
 #define TPLEX_FUZZ_FILE_NAMES_HARNESS_H
 
