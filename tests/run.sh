@@ -69,12 +69,13 @@ windows_build_and_test() {
 lint() {
     need_packages clang-format clang-tidy
     echo "== lint"
-    git -C "$root" ls-files '*.c' '*.cpp' '*.h' | (cd "$root" && xargs clang-format --dry-run -Werror)
+    local sources=(lex dict scan source errors table_output tools tests fuzz include bench)
+    (cd "$root" && find "${sources[@]}" -path bench/build -prune -o \
+        \( -name '*.c' -o -name '*.cpp' -o -name '*.h' \) -print | xargs clang-format --dry-run -Werror)
     local dir="$root/build-tests/lint"
     cmake -S "$root" -B "$dir" -DCMAKE_EXPORT_COMPILE_COMMANDS=ON -DTPLEX_BUILD_TESTS=OFF >/dev/null
-    (cd "$root" && git ls-files 'lex/*.cpp' 'dict/*.cpp' 'scan/*.cpp' 'source/*.cpp' 'errors/*.cpp' \
-        'table_output/*.cpp' 'tools/*.cpp' | grep -v platform_windows |
-        xargs clang-tidy -p "$dir" --quiet)
+    (cd "$root" && find lex dict scan source errors table_output tools -name '*.cpp' \
+        ! -name platform_windows.cpp | xargs clang-tidy -p "$dir" --quiet)
 }
 
 fuzz_targets() {
