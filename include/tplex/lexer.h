@@ -305,8 +305,9 @@ TPLEX_API status_code TPLEX_CALL sc_next_token(void);
 
 /* Predefines names as tk_hash_definition with value 2, turning each of the
  * caller's strings to upper case in place. 0, or TPLEX_ALREADY_DEFINED at
- * the first name already known, or TPLEX_MALLOC_FAILED at the first that
- * cannot be stored (the names before it stay defined). */
+ * the first name already known, or the failure of storing one
+ * (TPLEX_MALLOC_FAILED, or TPLEX_DISASTER with the dictionary full); the
+ * names before it stay defined. */
 TPLEX_API status_code TPLEX_CALL sc_lex_init_defines(char **names, int32_t count);
 
 /* What sc_lex_init() runs. 0, or TPLEX_MALLOC_FAILED with nothing kept. */
