@@ -57,29 +57,12 @@ TEST_F(InspectorTest, BrokenTables) {
 TEST_F(InspectorTest, TruncatedAndMalformed) {
     for (std::uint32_t flags : {0u, TPLEX_OUT_HEX_TEXT}) {
         Bytes b = sample(flags);
-        for (std::size_t n = 0; n < b.size(); ++n) {
+        for (std::size_t n = 0; n < b.size(); ++n)
             EXPECT_NE(error_of(Bytes(b.begin(), b.begin() + n)), "") << n;
-        }
     }
     Bytes text = sample(TPLEX_OUT_HEX_TEXT);
     text[11] = ';';
     EXPECT_EQ(error_of(text), "malformed hex text at character 11");
-    EXPECT_EQ(error_of(Bytes(10)), "truncated: 10 bytes, the header alone needs 16");
-}
-
-TEST_F(InspectorTest, InspectFile) {
-    sample(TPLEX_OUT_HEX_TEXT);
-    CaptureStdout out;
-    EXPECT_EQ(inspect_table_file(path.c_str(), stdout, stderr), 0);
-    EXPECT_EQ(out.text(), "file: " + path +
-                              "\nform: hex text, 48 bytes\n"
-                              "header: tag 1, length 48, relocations at 32, word 60\n"
-                              "body: 12 bytes at offsets 16 to 28\n"
-                              "strings: 1, string table at 28\n  28: \"ab\"\n"
-                              "relocations: 2\n  16 -> 20\n  24 -> 28 (string)\n");
-    CaptureStderr err;
-    EXPECT_EQ(inspect_table_file((path + "x").c_str(), stdout, stderr), 1);
-    EXPECT_EQ(err.text(), "tplex table: cannot open '" + path + "x'\n");
 }
 
 // Random outputs (fixed seeds) of values, blocks, forward and backward

@@ -13,7 +13,6 @@
 #include <string>
 #include <vector>
 
-#include "lex/memory.h"
 #include "table_output/references.h"
 #include "table_output/table_check.h"
 #include "test_support.h"
@@ -30,12 +29,9 @@ public:
     ~CaptureStderr() { text(); }
     std::string text() {
         if (file_ == nullptr) return captured_;
-        dup2(saved_, 2);
-        close(saved_);
-        std::rewind(file_);
+        dup2(saved_, 2), close(saved_), std::rewind(file_);
         for (int c; (c = std::fgetc(file_)) != EOF;) captured_ += static_cast<char>(c);
-        std::fclose(file_);
-        file_ = nullptr;
+        std::fclose(file_), file_ = nullptr;
         return captured_;
     }
 
@@ -61,15 +57,10 @@ protected:
     TempDir dir;
     std::string path = dir.path() + "/out.tbl";
 
+    // The block stack outlives an output: leave no block open for the next
+    // test (RoundTrip leaves some), whatever order the tests run in.
     void TearDown() override {
-#ifdef TPLEX_ALLOC_HOOK
-        mem_fail_at(0);
-#endif
-        AbandonOutput(1);
-        FreeOutputTables();
-        FreeMemoryOutput();
-        // The block stack outlives an output: leave no block open for the
-        // next test (RoundTrip leaves some), whatever order the tests run in.
+        AbandonOutput(1), FreeOutputTables(), FreeMemoryOutput();
         while (EndBlock() != TPLEX_OUT_NO_OPEN_BLOCK) {
         }
         for (TableCheck &c : checks_) release_table_check(c);
@@ -81,11 +72,9 @@ protected:
         std::ifstream in(path, std::ios::binary);
         return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
-    bool exists() const {
-        return access(path.c_str(), F_OK) == 0;
-    }
-    // Closes and returns the checked table (decoded from hex text if need be),
-    // valid until the test ends.
+    bool exists() const { return access(path.c_str(), F_OK) == 0; }
+    // Closes and returns the checked table (decoded from hex text if need
+    // be), valid until the test ends.
     const TableCheck &closed() {
         EXPECT_EQ(CloseOutput(), TPLEX_OK);
         const Bytes &b = files_.emplace_back(file());
