@@ -7,6 +7,7 @@
 #include <cstring>
 
 #include "lex/lexer.h"
+#include "lex/text.h"
 #include "scan/char_source.h"
 #include "source/platform.h"
 
@@ -23,10 +24,8 @@ inline constexpr std::uint32_t no_line_yet = 0xFFFFFFFFu;
 
 // Length of text when it has at most limit characters, else limit + 1;
 // reads no further than that.
-std::size_t bounded_length(const char *text, std::size_t limit) {
-    std::size_t len = 0;
-    while (len <= limit && text[len] != '\0') ++len;
-    return len;
+inline std::size_t bounded_length(const char *text, std::size_t limit) {
+    return text_length(text, limit + 1);
 }
 
 // Puts an opened file on the stack as the new top frame.
