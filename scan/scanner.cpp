@@ -535,7 +535,7 @@ status_code scan_token() {
 // 20 deep are 4^20 bodies). Past this many tokens dropped from bodies in one
 // call, no real source is concerned: the pending bodies are abandoned and the
 // call reports the nesting failure, so it always returns.
-constexpr unsigned long max_dropped_from_bodies = 1ul << 22;
+constexpr unsigned long max_dropped_from_bodies = 1ul << 16;
 
 // The filter between the scanner and the parser, here so the scan inlines
 // into it: hash words are executed, ends of line dropped (the scan passes
