@@ -1,4 +1,4 @@
-# The test suite in a cross build (cmake/mingw-w64-i686.cmake): GoogleTest is
+# The test suite in a cross build (cmake/mingw-w64-*.cmake): GoogleTest is
 # compiled along from its sources, and each test program is one ctest test run
 # through CMAKE_CROSSCOMPILING_EMULATOR (Wine), since every start of a
 # Windows process there costs time.
