@@ -25,9 +25,9 @@ token_record &tok = current_token;
 // ends, reading resumes with the includer's next line.
 status_code do_include() {
     if (!region_live()) return 0;  // the name is then skipped like any token
-    // As in #define, a failure while the name is scanned is not passed on:
-    // nothing is opened and reading goes on after it.
-    if (scan_token() < 0) return 0;
+    // A name that cannot be scanned opens nothing: its failure is the result.
+    const status_code r = scan_token();
+    if (r < 0) return r;
     char name[text_size];  // any token's text names the file
     copy_text(name, text_size, tok.text);
     return open_source_file(name);

@@ -127,8 +127,12 @@ TEST(Include, FilesAndTheLinesAroundThem) {
     EXPECT_EQ(lex_files({"#include \"@1\"\nV\n#endif\nV", "#define V 42\n#ifdef NO\n"}),
               (Tokens{"n:42:42", "eof"}));
     EXPECT_EQ(lex_files({"#ifdef NO\n#include \"@1\"\n#endif\nb", "x\n"}), (Tokens{"id:B", "eof"}));
-    // A name that fails to scan opens nothing and is not reported.
-    EXPECT_EQ(lex_files({"#include $ x\nb"}), (Tokens{"id:X", "id:B", "eof"}));
+    // A name that fails to scan opens nothing; its failure is reported.
+    EXPECT_EQ(lex_files({"#include $ x\nb"}),
+              (Tokens{err(TPLEX_BAD_CHARACTER), "id:X", "id:B", "eof"}));
+    EXPECT_EQ(lex_files({"#include \"unterminated"}),
+              (Tokens{err(TPLEX_END_OF_LINE_IN_STRING), "eof"}));
+    EXPECT_EQ(lex_files({"#include 0b102\nb"}), (Tokens{err(TPLEX_BAD_DIGIT), "id:B", "eof"}));
     const Tokens missing = lex_files({"#include \"@9\" x\nb"});
     ASSERT_EQ(missing.size(), 4u);
     EXPECT_EQ(missing[0].substr(0, 4), "err:");
