@@ -99,15 +99,39 @@ TEST(ScannerLimits, DefineBodyLengths) {
     EXPECT_EQ(entry_after(line + " " + rep('z', 9) + "\n", "L").size(), 4u + 2488 + 10);
     EXPECT_EQ(lex(line + " " + rep('z', 10) + "\n").front(), err(TPLEX_MACRO_TOO_LONG));
     EXPECT_EQ(entry_after(line + " " + rep('z', 10) + "\n", "L"), "absent");
-    // A first string is quoted: with its blank it must fit 2499.
-    EXPECT_EQ(entry_after("#define S \"" + rep('s', 2496) + "\"\n", "S"),
-              "4:0|\"" + rep('s', 2496) + "\" ");
-    EXPECT_EQ(lex("#define S \"" + rep('s', 2497) + "\"\nS"),
+    // Every token is measured as spelled, the first one too: a string in
+    // quotes, a PDF string in its brackets, each quote inside doubled.
+    EXPECT_EQ(entry_after("#define S \"" + rep('s', 2495) + "\"\n", "S"),
+              "4:0|\"" + rep('s', 2495) + "\" ");
+    EXPECT_EQ(lex("#define S \"" + rep('s', 2496) + "\"\nS"),
               (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:S", "eof"}));
-    EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2498) + "\">\n", "P"),
-              "4:0|" + rep('p', 2498) + " ");
-    EXPECT_EQ(lex("#define P <\"" + rep('p', 2499) + "\">\nP"),
+    EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2493) + "\">\n", "P"),
+              "4:0|<\"" + rep('p', 2493) + "\"> ");
+    EXPECT_EQ(lex("#define P <\"" + rep('p', 2494) + "\">\nP"),
               (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:P", "eof"}));
+    EXPECT_EQ(entry_after("#define Q a \"" + rep('"', 2 * 1246) + "\"\n", "Q").size(),
+              4u + 2 + 2494 + 1);
+    EXPECT_EQ(lex("#define Q a \"" + rep('"', 2 * 1247) + "\"\n").front(),
+              err(TPLEX_MACRO_TOO_LONG));
+}
+
+// A body read through its name gives the tokens it gives written in place.
+TEST(DefineBody, ReadsBackAsWritten) {
+    const std::string bodies[] = {
+        "0x1F -0x10 0b101 -3 12 0 0X00ff 007 -0 4294967295 0b0",
+        rep('7', 130) + " x",  // the value needs digits beyond the 128 kept
+        "\"a\" \"say \"\"hi\"\"\" \"\" \"\"\"\"",
+        "x \"two words\" \"/* c */ //\" \"a\nb\"",
+        "<\"pdf\"> x <\"a\"\"b\"> <\"\">",
+        "/= || && <= >= << >> .. ^^ !=",
+        "% ( ) * + , : ; = [ ] { } ~ ! & - . / < > ^ | - 5",
+        "protocol State x_1 abc",
+        "'c' x",
+        "'\"'",
+        "<= 1",
+    };
+    for (const std::string &body : bodies)
+        EXPECT_EQ(lex("#define N " + body + "\nN"), lex(body)) << body;
 }
 
 TEST(Include, FilesAndTheLinesAroundThem) {
