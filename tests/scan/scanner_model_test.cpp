@@ -458,6 +458,8 @@ struct Model {
                 if (d < 0) return d;
             } else if (r == 5 || (r != 36 && live())) {
                 return r;
+            } else if (r == TPLEX_TOO_MANY_MACRO_LEVELS) {
+                bodies.clear();  // in a dead region every pending body is abandoned
             }
         }
     }

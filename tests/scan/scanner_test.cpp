@@ -134,6 +134,25 @@ TEST(DefineBody, ReadsBackAsWritten) {
         EXPECT_EQ(lex("#define N " + body + "\nN"), lex(body)) << body;
 }
 
+// Switched-off regions drop uses of defined names at no cost and without a
+// report; a name that names itself stops after 20 bodies. Only a tree of
+// names multiplying past 4 Mi tokens since the last character of a file is
+// cut off with a report.
+TEST(DefineBody, DroppedInSwitchedOffRegions) {
+    std::string uses, self, tree = "#define P L1 y\n";  // each name before its use
+    for (int i = 0; i < 100000; ++i) uses += "X\n";
+    for (int i = 0; i < 2000; ++i) self += "a b a\n";
+    for (int i = 1; i <= 11; ++i) {
+        const std::string next = i == 11 ? " x" : " L" + std::to_string(i + 1);
+        tree += "#define L" + std::to_string(i) + next + next + next + next + "\n";
+    }
+    EXPECT_EQ(lex("#define X 1 2 3\n#ifdef NO\n" + uses + "#endif\nz"), (Tokens{"id:Z", "eof"}));
+    EXPECT_EQ(lex("#define A a a a\n#define B b b\n#ifdef NO\n" + self + "#endif\nz"),
+              (Tokens{"id:Z", "eof"}));
+    EXPECT_EQ(lex(tree + "#ifdef NO\nL1\nP\n#endif\nz"),
+              (Tokens{err(TPLEX_TOO_MANY_MACRO_LEVELS), "id:Z", "eof"}));
+}
+
 TEST(Include, FilesAndTheLinesAroundThem) {
     // Nested files end into their includers' next lines; the rest of an
     // #include line is never read.
