@@ -98,7 +98,7 @@ std::size_t spell_number(char *out, std::size_t len) {
 
 // A string or PDF string with every quote inside doubled. Comment brackets
 // in the text are marker codes, which read back as themselves. (Only a "/"
-// and a "*" that met across the end of a 4999-character line piece stay two
+// and a "*" that met across the end of a line piece or of a file stay two
 // characters in the text; they read back folded into one marker.)
 std::size_t spell_quoted(char *out, std::size_t len, bool pdf) {
     char *p = out;
@@ -132,7 +132,7 @@ std::size_t spell_token(char *out) {
             }
             out[0] = static_cast<char>(tok.value & 0xFF);
             return 1;
-        case tk_char:  // only ever a first token
+        case tk_char:  // stored only as a first token
             if (len != 1) return spell_text(out, len);
             out[0] = '\'';
             out[1] = tok.text[0];

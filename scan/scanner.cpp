@@ -567,10 +567,11 @@ status_code next_token_filtered() {
         }
         if (r == tk_end_of_input || (r != tk_end_of_line && region_live())) break;
         if (macro_depth == 0) continue;
-        // A name nested too deep in a dead region: what the pending bodies
-        // hold would be dropped too, and none holds a directive after its
-        // first token, so they are abandoned. A name that names itself thus
-        // costs 20 expansions and no report.
+        // A name nested too deep in a dead region: every pending body is
+        // abandoned, as all that is left of them would be dropped too (a body
+        // holds a hash word only as its first token, read long since; a name
+        // left in one whose own body starts with a hash word goes with them).
+        // A name that names itself thus costs 20 expansions and no report.
         if (r == TPLEX_TOO_MANY_MACRO_LEVELS) {
             drop_macros();
             continue;
