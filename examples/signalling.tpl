@@ -50,7 +50,7 @@ PROTOCOL Signalling
     {
         MESSAGE TraceCopy VALUE 0xF0;
         FIELD Stamp : TIMESTAMP POSITION 0 LENGTH 8;
-        FIELD Mask  : UBYTE POSITION 8 VALUE TRACE_MASK;
+        FIELD LogMask : UBYTE POSITION 8 VALUE TRACE_MASK;
         GENERATE TraceCopy TO LOG;
     }
 #endif

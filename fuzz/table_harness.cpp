@@ -174,8 +174,10 @@ void rare_call(script_reader &s, output_model &m) {
         case 4:
             open_output(m);
             break;
-        case 5:
+        case 5:  // an open output goes on without the references made so far
             TPLEX_FUZZ_CHECK(FreeOutputTables() == 0, 0);
+            m.uses = 0;
+            m.ids.clear();
             break;
         case 6: {  // runs out of reference ids
             std::uint32_t id = 0;

@@ -25,9 +25,9 @@ token_record &tok = current_token;
 // ends, reading resumes with the includer's next line.
 status_code do_include() {
     if (!region_live()) return 0;  // the name is then skipped like any token
-    // As in #define, a failure while the name is scanned is not passed on:
-    // nothing is opened and reading goes on after it.
-    if (scan_token() < 0) return 0;
+    // A name that cannot be scanned opens nothing: its failure is the result.
+    const status_code r = scan_token();
+    if (r < 0) return r;
     char name[text_size];  // any token's text names the file
     copy_text(name, text_size, tok.text);
     return open_source_file(name);
@@ -55,52 +55,127 @@ status_code do_endif() {
     return 0;
 }
 
-// The body of a #define: the text of each token and one blank, the first
-// token's string in quotes. Returns 0 with the last scan's result in
-// last_scan, or a failure code.
-status_code read_body(char *body, status_code &last_scan) {
-    std::size_t n;
-    if (tok.kind == tk_string) {
-        // The quoted text and its blank must fit the body with its NUL.
-        const std::size_t len = text_length(tok.text, text_size);
-        if (len + 3 > text_size - 1) return TPLEX_MACRO_TOO_LONG;
-        n = static_cast<std::size_t>(
-            std::snprintf(body, text_size, "\"%.*s\" ", static_cast<int>(len), tok.text));
-    } else {
-        // The first token's kind is not tested: an operator or an end of
-        // input brings whatever text the record holds, and a text too long
-        // for the body with its blank is refused rather than cut.
-        const std::size_t len = text_length(tok.text, text_size);
-        if (len + 1 > text_size - 1) return TPLEX_MACRO_TOO_LONG;
-        std::memcpy(body, tok.text, len);
-        body[len] = ' ';
-        n = len + 1;
-    }
-    body[n] = '\0';
+// Spelling a body token so that scanning the body gives the same token
+// (kind, value and text) as scanning it where the name stands. The longest
+// spelling is a string of 2499 quotes, each doubled, between "<\"" and "\">".
+constexpr std::size_t spelling_size = 2 * std::size_t{text_size} + 8;
 
-    for (;;) {
+constexpr char pair_spellings[][3] = {"/=", "||", "&&", "<=", ">=", "<<", ">>", "..", "^^", "!="};
+static_assert(sizeof pair_spellings / sizeof pair_spellings[0] ==
+              op_not_equal - op_slash_equal + 1);
+
+std::size_t spell_text(char *out, std::size_t len) {
+    std::memcpy(out, tok.text, len);
+    return len;
+}
+
+// A number's digits as kept, with the sign and base prefix that give its
+// value back. A number cut to its first word_max digits gets eight more hex
+// digits holding its value: the digits before them shift out of 32 bits. A
+// record no base explains (left by a failed scan) keeps its bare text.
+std::size_t spell_number(char *out, std::size_t len) {
+    static constexpr struct {
+        std::uint8_t base;
+        char prefix[3];
+    } bases[] = {{10, ""}, {16, "0x"}, {2, "0b"}};
+    const auto value = static_cast<std::uint32_t>(tok.value);
+    for (const auto &b : bases) {
+        std::uint32_t number = 0;
+        bool digits = len > 0;
+        for (std::size_t i = 0; digits && i < len; ++i)
+            digits = add_digit(&number, static_cast<std::uint8_t>(tok.text[i]), b.base) == 0;
+        if (!digits || (number != value && 0u - number != value)) continue;
+        char *p = out;
+        if (number != value) *p++ = '-';
+        for (const char *q = b.prefix; *q != '\0';) *p++ = *q++;
+        return static_cast<std::size_t>(p - out) + spell_text(p, len);
+    }
+    if (len >= static_cast<std::size_t>(word_max))
+        return static_cast<std::size_t>(std::snprintf(out, spelling_size, "0x%.*s%08X",
+                                                      static_cast<int>(len), tok.text, value));
+    return spell_text(out, len);
+}
+
+// A string or PDF string with every quote inside doubled. Comment brackets
+// in the text are marker codes, which read back as themselves. (Only a "/"
+// and a "*" that met across the end of a line piece or of a file stay two
+// characters in the text; they read back folded into one marker.)
+std::size_t spell_quoted(char *out, std::size_t len, bool pdf) {
+    char *p = out;
+    if (pdf) *p++ = '<';
+    *p++ = '"';
+    for (std::size_t i = 0; i < len; ++i) {
+        if (tok.text[i] == '"') *p++ = '"';
+        *p++ = tok.text[i];
+    }
+    *p++ = '"';
+    if (pdf) *p++ = '>';
+    return static_cast<std::size_t>(p - out);
+}
+
+// The spelling of the token in the record; any kind without one of its own
+// (a word, a name) is its text.
+std::size_t spell_token(char *out) {
+    const std::size_t len = text_length(tok.text, text_size);
+    switch (tok.kind) {
+        case tk_number:
+            return spell_number(out, len);
+        case tk_string:
+        case tk_pdf_string:
+            return spell_quoted(out, len, tok.kind == tk_pdf_string);
+        case tk_operator:
+            if (tok.value >= op_slash_equal && tok.value <= op_not_equal) {
+                const char *pair = pair_spellings[tok.value - op_slash_equal];
+                out[0] = pair[0];
+                out[1] = pair[1];
+                return 2;
+            }
+            out[0] = static_cast<char>(tok.value & 0xFF);
+            return 1;
+        case tk_char:  // stored only as a first token
+            if (len != 1) return spell_text(out, len);
+            out[0] = '\'';
+            out[1] = tok.text[0];
+            out[2] = '\'';
+            return 3;
+        default:
+            return spell_text(out, len);
+    }
+}
+
+bool allowed_in_body(std::uint16_t kind) {
+    return kind == tk_number || kind == tk_string || kind == tk_reserved_word ||
+           kind == tk_new_identifier || kind == tk_pdf_string || kind == tk_operator;
+}
+
+// Appends the token in the record, spelled, and one blank. The spelling must
+// fit with room to spare (body, spelling and 2 reaching text_size is too
+// long); then a kind that a body may not hold is refused.
+status_code append_token(char *body, std::size_t &n, bool allowed) {
+    char spelled[spelling_size];
+    const std::size_t len = spell_token(spelled);
+    if (n + len + 2 >= text_size) return TPLEX_MACRO_TOO_LONG;
+    if (!allowed) return TPLEX_MACRO_BAD_TOKEN;
+    std::memcpy(body + n, spelled, len);
+    n += len;
+    body[n++] = ' ';
+    body[n] = '\0';
+    return 0;
+}
+
+// The body of a #define: each token spelled, and one blank. The first
+// token's kind is not tested: an end of input there brings whatever text
+// the record holds. Returns 0 with the last scan's result in last_scan, or
+// a failure code.
+status_code read_body(char *body, status_code &last_scan) {
+    std::size_t n = 0;
+    status_code r = append_token(body, n, true);
+    while (r == 0) {
         last_scan = scan_token();
         if (last_scan == tk_end_of_line || last_scan == tk_end_of_input) return 0;
-        const std::size_t len = text_length(tok.text, text_size);
-        if (n + len + 2 >= text_size) return TPLEX_MACRO_TOO_LONG;
-        switch (tok.kind) {
-            case tk_number:
-            case tk_string:
-            case tk_reserved_word:
-            case tk_new_identifier:
-            case tk_pdf_string:
-                std::memcpy(body + n, tok.text, len);
-                n += len;
-                break;
-            case tk_operator:
-                body[n++] = static_cast<char>(tok.value & 0xFF);
-                break;
-            default:
-                return TPLEX_MACRO_BAD_TOKEN;
-        }
-        body[n++] = ' ';
-        body[n] = '\0';
+        r = append_token(body, n, allowed_in_body(tok.kind));
     }
+    return r;
 }
 
 // Stores a name with its body. A name that cannot be stored whole is not

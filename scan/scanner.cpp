@@ -13,6 +13,7 @@
 #include "lex/lexer.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
+#include "source/source_stack.h"
 
 namespace tplex {
 
@@ -530,12 +531,21 @@ status_code scan_token() {
     return scan<false>();
 }
 
-// Dropping is not free. In a switched-off region, bodies that name bodies
-// several times over can keep one call dropping tokens for ever (four names
-// 20 deep are 4^20 bodies). Past this many tokens dropped from bodies in one
-// call, no real source is concerned: the pending bodies are abandoned and the
-// call reports the nesting failure, so it always returns.
-constexpr unsigned long max_dropped_from_bodies = 1ul << 16;
+// Where reading stands in the current file. While bodies are pending, the
+// file's frame holds its read position, so this changes exactly when a
+// character has been read from a file since.
+std::uint64_t file_position() {
+    if (source_stack == nullptr || source_depth < 1 || source_depth > max_source_depth) return 0;
+    const source_frame &f = source_stack[source_depth];
+    return std::uint64_t{f.line_no} << 21 | std::uint64_t(source_depth) << 16 | f.read_pos;
+}
+
+// In a switched-off region, tokens dropped from bodies are counted from the
+// last character read from a file. Only a tree of distinct names that
+// multiplies out (four names 20 deep are 4^20 bodies) gets this far: its
+// pending bodies are abandoned and the call reports the nesting failure, so
+// a call always returns.
+constexpr unsigned long max_dropped_from_bodies = 1ul << 22;
 
 // The filter between the scanner and the parser, here so the scan inlines
 // into it: hash words are executed, ends of line dropped (the scan passes
@@ -544,6 +554,7 @@ constexpr unsigned long max_dropped_from_bodies = 1ul << 16;
 status_code next_token_filtered() {
     status_code r;
     unsigned long dropped_from_bodies = 0;
+    std::uint64_t counted_from = 0;
     for (;;) {
         r = scan<true>();
         if (r == tk_hash_word) {
@@ -555,7 +566,22 @@ status_code next_token_filtered() {
             continue;
         }
         if (r == tk_end_of_input || (r != tk_end_of_line && region_live())) break;
-        if (macro_depth > 0 && ++dropped_from_bodies > max_dropped_from_bodies) {
+        if (macro_depth == 0) continue;
+        // A name nested too deep in a dead region: every pending body is
+        // abandoned, as all that is left of them would be dropped too (a body
+        // holds a hash word only as its first token, read long since; a name
+        // left in one whose own body starts with a hash word goes with them).
+        // A name that names itself thus costs 20 expansions and no report.
+        if (r == TPLEX_TOO_MANY_MACRO_LEVELS) {
+            drop_macros();
+            continue;
+        }
+        const std::uint64_t here = file_position();
+        if (here != counted_from) {
+            counted_from = here;
+            dropped_from_bodies = 0;
+        }
+        if (++dropped_from_bodies > max_dropped_from_bodies) {
             drop_macros();
             r = TPLEX_TOO_MANY_MACRO_LEVELS;
             break;

@@ -89,8 +89,9 @@ bool is_absolute_path(const char *name) {
     return false;
 }
 
-// A failed open changes no frame at all: the frame above the top already
-// holds no file, and its position is only set once a file is on it.
+// A failed open leaves the frame it would have used as a frame without a
+// file (position 0, no line yet, no stream), where the parser can see it;
+// the depth and the file below are unchanged.
 status_code open_source_file(const char *name) {
     if (source_stack == nullptr) return TPLEX_NOT_INITIALISED;
     if (name == nullptr) return TPLEX_NULL_FILENAME;
@@ -100,9 +101,20 @@ status_code open_source_file(const char *name) {
     // followed outside the block.
     if (source_depth < 0 || source_depth >= max_source_depth) return TPLEX_TOO_MANY_INCLUDE_LEVELS;
 
-    if (is_absolute_path(name)) return open_as_given(name, TPLEX_CANNOT_OPEN_SOURCE);
-    if (include_dir_count > 0) return open_from_include_dirs(name);
-    return open_as_given(name, TPLEX_NO_INCLUDE_DIRS);
+    status_code result;
+    if (is_absolute_path(name))
+        result = open_as_given(name, TPLEX_CANNOT_OPEN_SOURCE);
+    else if (include_dir_count > 0)
+        result = open_from_include_dirs(name);
+    else
+        result = open_as_given(name, TPLEX_NO_INCLUDE_DIRS);
+    if (result < 0) {
+        source_frame &failed = source_stack[source_depth + 1];
+        failed.read_pos = 0;
+        failed.line_no = no_line_yet;
+        failed.file = nullptr;
+    }
+    return result;
 }
 
 // Before the stack exists there is nothing open to close: 0.

@@ -373,10 +373,10 @@ status_code AbandonOutput(uint32_t free_tables) {
 }
 
 status_code FreeOutputTables(void) {
-    // An output still being written loses its references and strings with
-    // the tables, so it fails as after any failure: its file is closed (no
-    // CloseOutput can then pass it off as complete), AbandonOutput deletes it.
-    if (table_output.open) tplex::close_output_file();
+    // The output file is not touched: an output still being written goes
+    // on without the references and strings made so far. Later ones cannot
+    // reach the freed tables: with no table no id is handed out, and a
+    // string gets a new first chunk.
     tplex::release_chunks(table_output.store.first);
     table_output.store = tplex::StringStore{};
     if (table_output.relocatables != nullptr) {

@@ -320,9 +320,10 @@ TPLEX_API status_code TPLEX_CALL lex_free(void);
 TPLEX_API void TPLEX_CALL back_token(void);
 
 /* Pushes a source frame for a file, searching the include directories for
- * a relative name. The new source depth, or TPLEX_TOO_MANY_INCLUDE_LEVELS,
- * TPLEX_CANNOT_OPEN_SOURCE or TPLEX_NO_INCLUDE_DIRS with the stack as it
- * was. */
+ * a relative name. The new source depth; or TPLEX_TOO_MANY_INCLUDE_LEVELS
+ * with the stack as it was; or TPLEX_CANNOT_OPEN_SOURCE or
+ * TPLEX_NO_INCLUDE_DIRS with the depth as it was and the frame above it
+ * holding no file (read_pos 0, line_no 0xFFFFFFFF, file null). */
 TPLEX_API status_code TPLEX_CALL open_source_file(const char *name);
 
 /* Resets the lexer to the keywords, closes every source and reopens the

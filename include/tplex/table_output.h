@@ -61,10 +61,10 @@ status_code CloseOutput(void);
  * free_tables non-zero also FreeOutputTables(). TPLEX_OUT_NOT_OPEN, doing
  * nothing, when no output is open. */
 status_code AbandonOutput(uint32_t free_tables);
-/* Releases the string store and the reference table; always 0. An output
- * still open loses its references and strings with them and so fails: its
- * file is closed (CloseOutput then reports TPLEX_OUT_WRITE_FAILED), and
- * AbandonOutput deletes it. */
+/* Releases the string store and the reference table; always 0. The output
+ * file is not touched: an output still open goes on without the references
+ * and strings made so far (no further reference id can be handed out until
+ * the next OpenOutput). */
 status_code FreeOutputTables(void);
 
 /* ------------------------------------------------------------------------ */

@@ -227,7 +227,8 @@ TEST(AllocFailure, OpenOutput) {
     TempDir dir;
     const std::string file = dir.path() + "/t.tbl";
     int32_t r = 0;
-    walk_failures([] { FreeOutputTables(); }, [&] { r = OpenOutput(file.c_str(), 0, 7); },
+    walk_failures([] { AbandonOutput(1), FreeOutputTables(); },
+                  [&] { r = OpenOutput(file.c_str(), 0, 7); },
                   [&](unsigned long) {
                       EXPECT_EQ(r, TPLEX_OUT_NO_MEMORY_TABLES);
                       EXPECT_EQ(AbandonOutput(1), TPLEX_OUT_NOT_OPEN);

@@ -368,27 +368,16 @@ struct Model {
             return name_kind != 25 ? TPLEX_BAD_HASH_WORD : 36;
         }
         if (lookup(name) == 1) return TPLEX_MACRO_REDEFINED;
-        const std::size_t first = rec.text.size() + (rec.kind == 2 ? 3 : 1);
-        if (first > 2499) return TPLEX_MACRO_TOO_LONG;
-        std::string body = rec.kind == 2 ? "\"" + rec.text + "\" " : rec.text + " ";
+        std::string body;
         std::int32_t last;
-        while ((last = scan()) != 36 && last != 5) {
-            if (body.size() + rec.text.size() + 2 >= 2500) return TPLEX_MACRO_TOO_LONG;
-            switch (rec.kind) {
-                case 1:
-                case 2:
-                case 9:
-                case 10:
-                case 33:
-                    body += rec.text;
-                    break;
-                case 3:
-                    body.push_back(static_cast<char>(rec.value & 0xFF));
-                    break;
-                default:
-                    return TPLEX_MACRO_BAD_TOKEN;
-            }
-            body += " ";
+        for (bool first = true;; first = false) {
+            const std::string spelled = spell();
+            if (body.size() + spelled.size() + 2 >= 2500) return TPLEX_MACRO_TOO_LONG;
+            const int k = rec.kind;
+            if (!first && k != 1 && k != 2 && k != 3 && k != 9 && k != 10 && k != 33)
+                return TPLEX_MACRO_BAD_TOKEN;
+            body += spelled + " ";
+            if ((last = scan()) == 36 || last == 5) break;
         }
         if (lookup(name) == 1) return TPLEX_MACRO_REDEFINED;
         if (live() && tplex::dict_insert(4, 0, name.c_str()) == 0) {
@@ -396,6 +385,38 @@ struct Model {
             tplex::dict_extend(body.c_str(), "", "", 0, 0, 0);
         }
         return last;
+    }
+
+    // The record as body text that scans back to the same token.
+    std::string spell() const {
+        static const char *const pairs[] = {
+            "/=", "||", "&&", "<=", ">=", "<<", ">>", "..", "^^", "!="};
+        std::string quoted;
+        switch (rec.kind) {
+            case 1:
+                for (const int base : {10, 16, 2}) {
+                    std::uint32_t n = 0;
+                    bool digits = !rec.text.empty();
+                    for (const char c : rec.text) digits = digits && add_digit(n, c, base) == 0;
+                    const std::string prefix = base == 16 ? "0x" : base == 2 ? "0b" : "";
+                    const auto v = static_cast<std::uint32_t>(rec.value);
+                    if (digits && (n == v || 0u - n == v))
+                        return (n == v ? "" : "-") + prefix + rec.text;
+                }
+                return rec.text;
+            case 2:
+            case 33:
+                for (const char c : rec.text) quoted += c == '"' ? "\"\"" : std::string(1, c);
+                return rec.kind == 2 ? "\"" + quoted + "\"" : "<\"" + quoted + "\">";
+            case 3:
+                return rec.value >= 2 && rec.value <= 11
+                           ? pairs[rec.value - 2]
+                           : std::string(1, static_cast<char>(rec.value & 0xFF));
+            case 34:
+                return rec.text.size() == 1 ? "'" + rec.text + "'" : rec.text;
+            default:
+                return rec.text;
+        }
     }
 
     std::int32_t directive() {
@@ -437,6 +458,8 @@ struct Model {
                 if (d < 0) return d;
             } else if (r == 5 || (r != 36 && live())) {
                 return r;
+            } else if (r == TPLEX_TOO_MANY_MACRO_LEVELS) {
+                bodies.clear();  // in a dead region every pending body is abandoned
             }
         }
     }

@@ -99,15 +99,58 @@ TEST(ScannerLimits, DefineBodyLengths) {
     EXPECT_EQ(entry_after(line + " " + rep('z', 9) + "\n", "L").size(), 4u + 2488 + 10);
     EXPECT_EQ(lex(line + " " + rep('z', 10) + "\n").front(), err(TPLEX_MACRO_TOO_LONG));
     EXPECT_EQ(entry_after(line + " " + rep('z', 10) + "\n", "L"), "absent");
-    // A first string is quoted: with its blank it must fit 2499.
-    EXPECT_EQ(entry_after("#define S \"" + rep('s', 2496) + "\"\n", "S"),
-              "4:0|\"" + rep('s', 2496) + "\" ");
-    EXPECT_EQ(lex("#define S \"" + rep('s', 2497) + "\"\nS"),
+    // Every token is measured as spelled, the first one too: a string in
+    // quotes, a PDF string in its brackets, each quote inside doubled.
+    EXPECT_EQ(entry_after("#define S \"" + rep('s', 2495) + "\"\n", "S"),
+              "4:0|\"" + rep('s', 2495) + "\" ");
+    EXPECT_EQ(lex("#define S \"" + rep('s', 2496) + "\"\nS"),
               (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:S", "eof"}));
-    EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2498) + "\">\n", "P"),
-              "4:0|" + rep('p', 2498) + " ");
-    EXPECT_EQ(lex("#define P <\"" + rep('p', 2499) + "\">\nP"),
+    EXPECT_EQ(entry_after("#define P <\"" + rep('p', 2493) + "\">\n", "P"),
+              "4:0|<\"" + rep('p', 2493) + "\"> ");
+    EXPECT_EQ(lex("#define P <\"" + rep('p', 2494) + "\">\nP"),
               (Tokens{err(TPLEX_MACRO_TOO_LONG), "id:P", "eof"}));
+    EXPECT_EQ(entry_after("#define Q a \"" + rep('"', 2 * 1246) + "\"\n", "Q").size(),
+              4u + 2 + 2494 + 1);
+    EXPECT_EQ(lex("#define Q a \"" + rep('"', 2 * 1247) + "\"\n").front(),
+              err(TPLEX_MACRO_TOO_LONG));
+}
+
+// A body read through its name gives the tokens it gives written in place.
+TEST(DefineBody, ReadsBackAsWritten) {
+    const std::string bodies[] = {
+        "0x1F -0x10 0b101 -3 12 0 0X00ff 007 -0 4294967295 0b0",
+        rep('7', 130) + " x",  // the value needs digits beyond the 128 kept
+        "\"a\" \"say \"\"hi\"\"\" \"\" \"\"\"\"",
+        "x \"two words\" \"/* c */ //\" \"a\nb\"",
+        "<\"pdf\"> x <\"a\"\"b\"> <\"\">",
+        "/= || && <= >= << >> .. ^^ !=",
+        "% ( ) * + , : ; = [ ] { } ~ ! & - . / < > ^ | - 5",
+        "protocol State x_1 abc",
+        "'c' x",
+        "'\"'",
+        "<= 1",
+    };
+    for (const std::string &body : bodies)
+        EXPECT_EQ(lex("#define N " + body + "\nN"), lex(body)) << body;
+}
+
+// Switched-off regions drop uses of defined names at no cost and without a
+// report; a name that names itself stops after 20 bodies. Only a tree of
+// names multiplying past 4 Mi tokens since the last character of a file is
+// cut off with a report.
+TEST(DefineBody, DroppedInSwitchedOffRegions) {
+    std::string uses, self, tree = "#define P L1 y\n";  // each name before its use
+    for (int i = 0; i < 100000; ++i) uses += "X\n";
+    for (int i = 0; i < 2000; ++i) self += "a b a\n";
+    for (int i = 1; i <= 11; ++i) {
+        const std::string next = i == 11 ? " x" : " L" + std::to_string(i + 1);
+        tree += "#define L" + std::to_string(i) + next + next + next + next + "\n";
+    }
+    EXPECT_EQ(lex("#define X 1 2 3\n#ifdef NO\n" + uses + "#endif\nz"), (Tokens{"id:Z", "eof"}));
+    EXPECT_EQ(lex("#define A a a a\n#define B b b\n#ifdef NO\n" + self + "#endif\nz"),
+              (Tokens{"id:Z", "eof"}));
+    EXPECT_EQ(lex(tree + "#ifdef NO\nL1\nP\n#endif\nz"),
+              (Tokens{err(TPLEX_TOO_MANY_MACRO_LEVELS), "id:Z", "eof"}));
 }
 
 TEST(Include, FilesAndTheLinesAroundThem) {
@@ -127,8 +170,12 @@ TEST(Include, FilesAndTheLinesAroundThem) {
     EXPECT_EQ(lex_files({"#include \"@1\"\nV\n#endif\nV", "#define V 42\n#ifdef NO\n"}),
               (Tokens{"n:42:42", "eof"}));
     EXPECT_EQ(lex_files({"#ifdef NO\n#include \"@1\"\n#endif\nb", "x\n"}), (Tokens{"id:B", "eof"}));
-    // A name that fails to scan opens nothing and is not reported.
-    EXPECT_EQ(lex_files({"#include $ x\nb"}), (Tokens{"id:X", "id:B", "eof"}));
+    // A name that fails to scan opens nothing; its failure is reported.
+    EXPECT_EQ(lex_files({"#include $ x\nb"}),
+              (Tokens{err(TPLEX_BAD_CHARACTER), "id:X", "id:B", "eof"}));
+    EXPECT_EQ(lex_files({"#include \"unterminated"}),
+              (Tokens{err(TPLEX_END_OF_LINE_IN_STRING), "eof"}));
+    EXPECT_EQ(lex_files({"#include 0b102\nb"}), (Tokens{err(TPLEX_BAD_DIGIT), "id:B", "eof"}));
     const Tokens missing = lex_files({"#include \"@9\" x\nb"});
     ASSERT_EQ(missing.size(), 4u);
     EXPECT_EQ(missing[0].substr(0, 4), "err:");

@@ -38,13 +38,23 @@ protected:
     void dirs(std::initializer_list<const char *> list) {
         for (const char *d : list) ASSERT_EQ(add_include_dir(d), TPLEX_OK) << d;
     }
-    // The open fails with code and leaves every frame and the depth as they were.
+    // The open fails with code and leaves the depth and every frame as they
+    // were, except that a file that could not be opened leaves the frame it
+    // would have used at position 0, with no line and no file.
     void expect_refused(const std::string &name, status_code code) {
+        const int16_t depth = source_depth;
+        source_frame *failed = depth < max_source_depth ? &frames_[depth + 1] : nullptr;
+        if (failed != nullptr) failed->read_pos = 7, failed->line_no = 3;  // an earlier file's
         std::string before(reinterpret_cast<char *>(frames_.get()),
                            sizeof(source_frame) * source_frame_count);
-        const int16_t depth = source_depth;
         EXPECT_EQ(open_source_file(name.c_str()), code) << name;
         EXPECT_EQ(source_depth, depth);
+        if (failed != nullptr && code != TPLEX_TOO_MANY_INCLUDE_LEVELS) {
+            EXPECT_EQ(failed->read_pos, 0) << name;
+            EXPECT_EQ(failed->line_no, 0xFFFFFFFFu) << name;
+            EXPECT_EQ(failed->file, nullptr) << name;
+            failed->read_pos = 7, failed->line_no = 3;
+        }
         EXPECT_EQ(std::memcmp(before.data(), frames_.get(), before.size()), 0)
             << "frames changed: " << name;
     }

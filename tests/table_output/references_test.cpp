@@ -42,6 +42,26 @@ TEST_F(ReferencesTest, Framing) {
               "01 00 00 00 18 00 00 00 18 00 00 00 3c 00 00 00 00 00 00 00 00 3c 3c 3c");
 }
 
+// Freeing the tables leaves an open output alone: it closes whole. What is
+// made after the free cannot reach the freed tables: a string gets a new
+// chunk, and with no table no reference id is handed out.
+TEST_F(ReferencesTest, FreeingTheTablesLeavesTheOutputOpen) {
+    open(0, 3);
+    WriteUInt8(1);
+    EXPECT_EQ(FreeOutputTables(), TPLEX_OK);
+    WriteUInt8(2);
+    ASSERT_EQ(CloseOutput(), TPLEX_OK);
+    EXPECT_EQ(hex(file().data(), 0, 20),
+              "03 00 00 00 14 00 00 00 14 00 00 00 3c 00 00 00 01 02 3c 3c");
+    EXPECT_EQ(file().size(), 20u);
+    open();
+    FreeOutputTables();
+    std::uint32_t position = 0;
+    EXPECT_EQ(AddToStringStore(&position, "s"), TPLEX_OK);
+    EXPECT_EQ(position, 1u);
+    EXPECT_EQ(WriteReference(nullptr, 0), TPLEX_OUT_TOO_MANY_REFERENCES);
+}
+
 // Entries id by id, use by use; strings at S, S + 3 after 0x00 padding.
 TEST_F(ReferencesTest, EntriesAndStrings) {
     open();
