@@ -502,7 +502,8 @@ int run_check(const Options &opt) {
     for (const std::string &line : warnings.lines()) std::printf("%s\n", line.c_str());
     std::printf("\n%s: %lu failure%s", display_path(opt.file).c_str(), log.count(),
                 log.count() == 1 ? "" : "s");
-    if (warned > 0) std::printf(", %zu warning%s", warned, warned == 1 ? "" : "s");
+    if (warned > 0)
+        std::printf(", %lu warning%s", static_cast<unsigned long>(warned), warned == 1 ? "" : "s");
     std::printf("\n");
     if (log.count() > 0 || (opt.strict && warned > 0)) return exit_failures;
     return exit_clean;
