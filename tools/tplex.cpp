@@ -129,6 +129,8 @@ bool parse_count(const std::string &text, unsigned long &count) {
     return true;
 }
 
+const std::string max_failures_option = "--max-failures";
+
 // Parses the arguments after the command name. Returns -1 to go on, else
 // the exit status (help shown, or a usage error).
 int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
@@ -152,11 +154,12 @@ int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
                 if (value.empty()) return usage_error(cmd.name, arg + " needs a value");
                 (arg[1] == 'I' ? opt.include_dirs : opt.defines).push_back(value);
             } else if ((cmd.options & takes_lexing) != 0 &&
-                       arg.compare(0, 14, "--max-failures") == 0 &&
-                       (arg.size() == 14 || arg[14] == '=')) {
+                       arg.compare(0, max_failures_option.size(), max_failures_option) == 0 &&
+                       (arg.size() == max_failures_option.size() ||
+                        arg[max_failures_option.size()] == '=')) {
                 std::string value;
-                if (arg.size() > 14)
-                    value = arg.substr(15);
+                if (arg.size() > max_failures_option.size())
+                    value = arg.substr(max_failures_option.size() + 1);  // after "="
                 else if (i + 1 < argc)
                     value = argv[++i];
                 if (!parse_count(value, opt.max_failures))

@@ -109,6 +109,12 @@ printf 'STATE a;\n#ifdef X\n/* open\n' >inc/open.tpl
 printf 'PROCESS p;\n#ifndef Y\n#include "inc\\open.tpl"\n' >main.tpl
 printf 'STATE "gr\303\274\303\237e \376\303!";\n' >utf8.tpl
 
+# Root reads any file: permission denied shows only to a plain user.
+if [ "$(id -u)" != 0 ] && [ "${TPLEX_TARGET_SYSTEM:-}" != Windows ]; then
+    printf 'STATE a;\n' >secret.tpl && chmod 000 secret.tpl
+    expect 2 "^tplex: cannot open secret.tpl: permission denied $no_dirs" check secret.tpl
+fi
+
 expect 1 '^\.\.\. 50 more failures not shown \(--max-failures 100\)$' check dollars.tpl
 expect_lines 1 150 '"Bad Character"$' tokens --max-failures 0 dollars.tpl
 
