@@ -127,6 +127,11 @@ expect 0 "^inc[/\\]open.tpl:2: $region" check main.tpl
 expect 0 '^main.tpl: 0 failures, 3 warnings$' check main.tpl
 expect 1 '^main.tpl: 0 failures, 3 warnings$' check --strict main.tpl
 
+# As README tells parser authors: a minus sign touching a digit is the
+# number's sign.
+printf 'x-1\n' >minus.tpl
+expect 0 '^minus.tpl:1: number +-1 "1"$' tokens minus.tpl
+
 # JSON strings are UTF-8: stray bytes as \udcXX.
 expect 0 '"text":"grüße \\udcfe\\udcc3!"' tokens --json utf8.tpl
 
