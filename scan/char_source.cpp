@@ -3,6 +3,7 @@
 #include <cstring>
 
 #include "lex/text.h"
+#include "scan/pass_facts.h"
 #include "source/platform.h"
 #include "source/source_stack.h"
 
@@ -130,6 +131,7 @@ std::uint8_t read_char_slow() {
         // A file that has no more lines is closed and the includer goes on
         // with its next line.
         while (!platform::read_line(f->file, f->line_text, line_size)) {
+            note_file_end(*f);
             if (f->file != nullptr) platform::close_source(f->file);
             f->file = nullptr;
             --source_depth;

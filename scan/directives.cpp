@@ -8,6 +8,7 @@
 #include "lex/memory.h"
 #include "lex/text.h"
 #include "scan/char_source.h"
+#include "scan/pass_facts.h"
 #include "scan/scanner.h"
 #include "source/source_stack.h"
 
@@ -264,6 +265,7 @@ status_code process_hash_directive() {
             result = TPLEX_TOO_MANY_COND_LEVELS;
         else
             cond_stack[++cond_depth] = flag;
+        note_region_opened();
     }
     return result;
 }

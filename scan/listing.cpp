@@ -40,6 +40,10 @@ void wait_for_key() {
 }  // namespace
 
 void dict_list(std::uint8_t all) {
+    list_dictionary(all, true);
+}
+
+void list_dictionary(std::uint8_t all, bool pause) {
     std::int16_t line = 1;
     if (dict_slots != nullptr) {
         for (int s = 0; s < dict_slot_count; ++s) {
@@ -48,7 +52,7 @@ void dict_list(std::uint8_t all) {
             if (all == 0 && (e->kind == tk_reserved_word || e->kind == tk_hash_word)) continue;
             ++line;
             std::printf("\n%4d   %-15s   %s", s, kind_name(e->kind), e->name);
-            if (line % 10 == 0) wait_for_key();
+            if (pause && line % 10 == 0) wait_for_key();
         }
     }
     std::fputs("\n End of Listing \n", stdout);

@@ -11,6 +11,8 @@ namespace tplex {
 // and waits for a key (a non-NUL character on standard input, or its end)
 // after the 9th line and every 10 lines after it.
 void dict_list(std::uint8_t all);
+// dict_list, with the pause only when pause is true.
+void list_dictionary(std::uint8_t all, bool pause);
 
 // The listing's name of an entry kind ("Unknown" for the kinds it does not
 // name).

@@ -13,6 +13,7 @@
 #include "lex/lexer.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
+#include "scan/pass_facts.h"
 #include "source/source_stack.h"
 
 namespace tplex {
@@ -387,7 +388,9 @@ void skip_comment(const stop_set &stops) {
 // A block comment ends at "*/" (or the end of a body or of input); a line
 // comment takes its line feed, so no end of line follows it.
 void skip_block_comment() {
+    note_block_comment(true);
     skip_comment<ch_comment_close>(block_stops);
+    note_block_comment(false);
 }
 void skip_line_comment() {
     skip_comment<'\n'>(line_stops);

@@ -78,11 +78,42 @@ Diagnostic parse_diagnostic(const std::string &text) {
     return d;
 }
 
+// The length of the well-formed UTF-8 sequence at text[i] (2 to 4), or 0
+// when the byte there (at or above 0x80) starts none: no overlong forms,
+// no surrogates, nothing above U+10FFFF.
+std::size_t utf8_length(const std::string &text, std::size_t i) {
+    const auto byte = [&](std::size_t k) {
+        return k < text.size() ? static_cast<unsigned char>(text[k]) : 0u;
+    };
+    const unsigned c = byte(i);
+    std::size_t n;
+    unsigned low = 0x80, high = 0xBF;  // the allowed range of the second byte
+    if (c >= 0xC2 && c <= 0xDF) {
+        n = 2;
+    } else if (c >= 0xE0 && c <= 0xEF) {
+        n = 3;
+        if (c == 0xE0) low = 0xA0;
+        if (c == 0xED) high = 0x9F;
+    } else if (c >= 0xF0 && c <= 0xF4) {
+        n = 4;
+        if (c == 0xF0) low = 0x90;
+        if (c == 0xF4) high = 0x8F;
+    } else {
+        return 0;
+    }
+    if (byte(i + 1) < low || byte(i + 1) > high) return 0;
+    for (std::size_t k = 2; k < n; ++k)
+        if (byte(i + k) < 0x80 || byte(i + k) > 0xBF) return 0;
+    return n;
+}
+
 // Text between double quotes, with \\ \" \n \r \t, and every other byte
-// below 32 or above 126 written with the printf format `other`.
-std::string escaped(const std::string &text, const char *other) {
+// below 32 or above 126 written with the printf format `other`. With
+// utf8_as_is, well-formed UTF-8 sequences are copied unchanged.
+std::string escaped(const std::string &text, const char *other, bool utf8_as_is) {
     std::string out = "\"";
-    for (const char ch : text) {
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const char ch = text[i];
         const auto c = static_cast<unsigned char>(ch);
         switch (c) {
             case '\\':
@@ -100,14 +131,24 @@ std::string escaped(const std::string &text, const char *other) {
             case '\t':
                 out += "\\t";
                 break;
-            default:
-                if (c < 32 || c > 126) {
-                    char code[8];
-                    std::snprintf(code, sizeof code, other, c);
-                    out += code;
-                } else {
+            default: {
+                if (c >= 32 && c <= 126) {
                     out += ch;
+                    break;
                 }
+                const bool outside_ascii = utf8_as_is && c > 127;
+                const std::size_t n = outside_ascii ? utf8_length(text, i) : 0;
+                if (n > 0) {
+                    out.append(text, i, n);
+                    i += n - 1;
+                    break;
+                }
+                // A stray byte becomes the lone surrogate 0xDC00 + byte,
+                // which no well-formed text holds: the byte stays recoverable.
+                char code[8];
+                std::snprintf(code, sizeof code, other, outside_ascii ? 0xDC00u + c : c);
+                out += code;
+            }
         }
     }
     return out + "\"";
@@ -194,11 +235,19 @@ std::string operator_spelling(std::int32_t value) {
 }
 
 std::string quoted(const std::string &text) {
-    return escaped(text, "\\x%02x");
+    return escaped(text, "\\x%02x", false);
 }
 
 std::string json_string(const std::string &text) {
-    return escaped(text, "\\u%04x");
+    return escaped(text, "\\u%04x", true);
+}
+
+std::string display_path(std::string path) {
+#ifndef _WIN32
+    for (char &c : path)
+        if (c == '\\') c = '/';
+#endif
+    return path;
 }
 
 std::string hex_code(status_code code) {

@@ -35,9 +35,15 @@ std::string operator_spelling(std::int32_t value);
 // Text between double quotes with C escapes: \\ \" \n \r \t, and \xNN for
 // every other byte below 32 or above 126. Always one line.
 std::string quoted(const std::string &text);
-// A JSON string literal. Bytes above 127 become the code points of the
-// same number (the text read as Latin-1), so the result is valid UTF-8.
+// A JSON string literal, valid UTF-8: well-formed UTF-8 passes through,
+// and each byte above 127 that is not part of it is written as \udcXX
+// (0xDC00 plus the byte, a lone surrogate that no text holds, as Python's
+// "surrogateescape" does), so the original bytes can be recovered.
 std::string json_string(const std::string &text);
+
+// A path as the tool shows it: with "/" for "\" on a POSIX host, where
+// the library keeps the Windows separator in its frames.
+std::string display_path(std::string path);
 
 // "0xd3470207": a status code as lower-case hexadecimal.
 std::string hex_code(status_code code);

@@ -6,10 +6,14 @@
 // tplex table checks a table file with the table output module's checker.
 //
 // Exit status: 0 the input lexed without a failure (a sound table file),
-// 1 the input had failures (a damaged table file), 2 a usage error or a
-// file or option that the lexer refused.
+// 1 the input had failures (a damaged table file, or check --strict with
+// warnings), 2 a usage error, a file or option that the lexer refused, or
+// standard output that could not be written.
+#include <sys/stat.h>
+
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -17,18 +21,16 @@
 #ifdef _WIN32
 #include <io.h>
 #define tool_isatty _isatty
-#define TOOL_NULL_DEVICE "NUL"
 #else
 #include <unistd.h>
 #define tool_isatty isatty
-#define TOOL_NULL_DEVICE "/dev/null"
 #endif
 
-#include "scan/listing.h"
 #include "source/source_stack.h"
 #include "table_output/table_check.h"
 #include "tools/report.h"
 #include "tplex/lexer.h"
+#include "tplex/tool_queries.h"
 
 namespace tplex::tool {
 namespace {
@@ -43,6 +45,11 @@ constexpr int exit_usage = 2;
 // stays below it.
 constexpr unsigned long stuck_limit = 10000;
 
+// Failures reported by default before the rest are only counted: enough to
+// see every kind a source has, few enough that a binary file read as source
+// does not bury the terminal (a megabyte of "$" is a million failures).
+constexpr unsigned long default_max_failures = 100;
+
 const char *const program = "tplex";
 
 // ---------------------------------------------------------------------------
@@ -53,15 +60,18 @@ struct Options {
     std::vector<std::string> include_dirs;  // -I, in order
     std::vector<std::string> defines;       // -D, in order
     std::string file;
-    bool json = false;  // tokens --json
-    bool all = false;   // dict --all
+    bool json = false;                                  // tokens --json
+    bool all = false;                                   // dict --all
+    bool strict = false;                                // check --strict
+    unsigned long max_failures = default_max_failures;  // 0: no limit
 };
 
 // What a command accepts besides FILE.
 enum CommandOptions : unsigned {
-    takes_lexing = 1,  // -I and -D
+    takes_lexing = 1,  // -I, -D and --max-failures
     takes_json = 2,    // --json
     takes_all = 4,     // --all
+    takes_strict = 8,  // --strict
 };
 
 struct Command {
@@ -75,14 +85,17 @@ struct Command {
 const char *const lexing_options =
     "  -I DIR      search DIR for #include files (up to 9, in order); with none,\n"
     "              included names are opened relative to the current directory\n"
-    "  -D NAME     predefine NAME, as #define NAME would (case does not matter)\n";
+    "  -D NAME     predefine NAME, as #define NAME would (case does not matter)\n"
+    "  --max-failures N\n"
+    "              print at most N failures (default 100, 0 for no limit); the\n"
+    "              rest are counted, and the exit status is 1 all the same\n";
 const char *const help_option = "  -h, --help  show this help\n";
 
 void print_general_usage(std::FILE *out) {
     std::fprintf(out,
                  "usage: tplex tokens [--json] [-I DIR]... [-D NAME]... FILE\n"
                  "       tplex dict [--all] [-I DIR]... [-D NAME]... FILE\n"
-                 "       tplex check [-I DIR]... [-D NAME]... FILE\n"
+                 "       tplex check [--strict] [-I DIR]... [-D NAME]... FILE\n"
                  "       tplex table FILE\n"
                  "       tplex --version | --help\n"
                  "\n"
@@ -90,11 +103,12 @@ void print_general_usage(std::FILE *out) {
                  "\n"
                  "  tokens   print the token stream, one token or failure per line\n"
                  "  dict     lex FILE, then list the symbol dictionary\n"
-                 "  check    lex FILE once, print each failure and their number\n"
+                 "  check    lex FILE once, print each failure, warnings and the count\n"
                  "  table    check a table file (raw or hex text) and summarise it\n"
                  "\n"
                  "Run 'tplex COMMAND --help' for the options of a command.\n"
-                 "Exit status: 0 no failure, 1 the input had failures, 2 usage or I/O error.\n");
+                 "Exit status: 0 no failure, 1 the input had failures, 2 usage or I/O error.\n"
+                 "Paths are shown with '/' on POSIX hosts.\n");
 }
 
 int usage_error(const char *command, const std::string &what) {
@@ -105,6 +119,17 @@ int usage_error(const char *command, const std::string &what) {
         std::fprintf(stderr, "Run '%s --help' for usage.\n", program);
     return exit_usage;
 }
+
+// A --max-failures count: decimal digits only.
+bool parse_count(const std::string &text, unsigned long &count) {
+    if (text.empty() || text.size() > 9 ||
+        text.find_first_not_of("0123456789") != std::string::npos)
+        return false;
+    count = std::strtoul(text.c_str(), nullptr, 10);
+    return true;
+}
+
+const std::string max_failures_option = "--max-failures";
 
 // Parses the arguments after the command name. Returns -1 to go on, else
 // the exit status (help shown, or a usage error).
@@ -128,6 +153,19 @@ int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
                 }
                 if (value.empty()) return usage_error(cmd.name, arg + " needs a value");
                 (arg[1] == 'I' ? opt.include_dirs : opt.defines).push_back(value);
+            } else if ((cmd.options & takes_lexing) != 0 &&
+                       arg.compare(0, max_failures_option.size(), max_failures_option) == 0 &&
+                       (arg.size() == max_failures_option.size() ||
+                        arg[max_failures_option.size()] == '=')) {
+                std::string value;
+                if (arg.size() > max_failures_option.size())
+                    value = arg.substr(max_failures_option.size() + 1);  // after "="
+                else if (i + 1 < argc)
+                    value = argv[++i];
+                if (!parse_count(value, opt.max_failures))
+                    return usage_error(cmd.name, "--max-failures needs a count (0 to 999999999)");
+            } else if (arg == "--strict" && (cmd.options & takes_strict) != 0) {
+                opt.strict = true;
             } else if (arg == "--json" && (cmd.options & takes_json) != 0) {
                 opt.json = true;
             } else if (arg == "--all" && (cmd.options & takes_all) != 0) {
@@ -149,6 +187,28 @@ int parse_options(const Command &cmd, int argc, char **argv, Options &opt) {
 // One lexing session: the parser's calling order
 // ---------------------------------------------------------------------------
 
+// Why a file could not be opened, in terms the user can act on: the
+// library's status code says only that it failed. Empty when the file can
+// be opened now (the library's code is then the whole story).
+std::string open_failure_reason(const std::string &name) {
+    if (name.size() > TPLEX_PATH_SIZE - 1) {
+        return "the name is longer than the " + std::to_string(TPLEX_PATH_SIZE - 1) +
+               " characters a path may have";
+    }
+    // Opened as the library opens it: "\" is a separator on every host.
+    const std::string host = display_path(name);
+    struct stat st {};
+    if (stat(host.c_str(), &st) != 0) {
+        if (errno != ENOENT) return std::strerror(errno);
+        return name == "-" ? "not found; standard input is not read, name a file" : "not found";
+    }
+    if (S_ISDIR(st.st_mode)) return "is a directory";
+    std::FILE *file = std::fopen(host.c_str(), "r");
+    if (file == nullptr) return errno == EACCES ? "permission denied" : std::strerror(errno);
+    std::fclose(file);
+    return "";
+}
+
 class Session {
 public:
     Session() = default;
@@ -168,7 +228,7 @@ public:
     // else the exit status (the reason printed on standard error).
     int open(const Options &opt) {
         const status_code init = sc_lex_init();
-        if (init < 0) return io_error("cannot initialise the lexer", init);
+        if (init < 0) return io_error("cannot initialise the lexer", "", init);
         initialised_ = true;
         sc_lex_setup(&token_, &frames_, &depth_, nullptr, nullptr);
 
@@ -182,11 +242,12 @@ public:
                                                 "hash word or an earlier -D)");
         }
         const status_code opened = sc_lex_init_file(opt.file.c_str());
-        if (opened < 0) return io_error("cannot open " + opt.file, opened);
+        if (opened < 0)
+            return io_error("cannot open " + opt.file, open_failure_reason(opt.file), opened);
         main_file_ = opt.file;
         for (const std::string &dir : opt.include_dirs) {
             const status_code added = tplex::add_include_dir(dir.c_str());
-            if (added < 0) return io_error("-I " + dir, added);
+            if (added < 0) return io_error("-I " + dir, "", added);
         }
         return -1;
     }
@@ -194,17 +255,37 @@ public:
     const token_record &token() const { return *token_; }
 
     // Where the token just delivered ends: the file being read and its line.
-    // At the end of input no file is open any more: the main file's last line.
+    // At the end of input no file is open any more: the main file, the last
+    // one closed, at its last line.
     std::string file() const { return *depth_ >= 1 ? frames_[*depth_].path : main_file_; }
-    unsigned long line() const {
-        const source_frame &f = frames_[*depth_ >= 1 ? *depth_ : 1];
-        return static_cast<std::uint32_t>(f.line_no + 1u);
+    unsigned long line() const { return static_cast<std::uint32_t>(frame().line_no + 1u); }
+
+    // The diagnostic of a failure. Where the library shows no file (at the
+    // end of input), the position and line are those of file() and line().
+    Diagnostic diagnose(status_code code) const {
+        Diagnostic d = capture_diagnostic(code);
+        if (!d.has_position || d.file.empty()) {
+            d.has_position = true;
+            d.file = file();
+            d.line = static_cast<long>(line());
+            d.source = frame().line_text;
+            while (!d.source.empty() && d.source.back() == '\n') d.source.pop_back();
+        }
+        return d;
     }
 
 private:
-    int io_error(const std::string &what, status_code code) {
+    const source_frame &frame() const { return frames_[*depth_ >= 1 ? *depth_ : 1]; }
+
+    // "tplex: WHAT: REASON (CODE: MESSAGE)", or without REASON.
+    static int io_error(const std::string &what, const std::string &reason, status_code code) {
         const Diagnostic d = capture_diagnostic(code);
-        std::fprintf(stderr, "%s: %s: %s\n", program, what.c_str(), d.message.c_str());
+        const std::string library = hex_code(code) + ": " + d.message;
+        if (reason.empty())
+            std::fprintf(stderr, "%s: %s: %s\n", program, what.c_str(), d.message.c_str());
+        else
+            std::fprintf(stderr, "%s: %s: %s (%s)\n", program, what.c_str(), reason.c_str(),
+                         library.c_str());
         return exit_usage;
     }
 
@@ -219,7 +300,7 @@ private:
 class StuckGuard {
 public:
     // False once the same failure has come stuck_limit times in a row.
-    bool note_failure(status_code code, const std::string &file, long line) {
+    bool note_failure(status_code code, const std::string &file, unsigned long line) {
         if (count_ > 0 && code == code_ && line == line_ && file == file_) {
             return ++count_ < stuck_limit;
         }
@@ -234,41 +315,103 @@ public:
 private:
     status_code code_ = 0;
     std::string file_;
-    long line_ = 0;
+    unsigned long line_ = 0;
     unsigned long count_ = 0;
 };
 
-void report_stuck(const std::string &file, long line) {
+void report_stuck(const std::string &file, unsigned long line) {
     std::fflush(stdout);
-    std::fprintf(stderr, "%s: %s:%ld: the same failure came %lu times without progress; stopped\n",
-                 program, file.c_str(), line, stuck_limit);
+    std::fprintf(stderr, "%s: %s:%lu: the same failure came %lu times without progress; stopped\n",
+                 program, display_path(file).c_str(), line, stuck_limit);
 }
 
-// Runs sc_next_token to the end of input. on_token sees every token (the
-// end of input included), on_failure every failure with its diagnostic.
-// Returns the number of failures.
+// What the language lets pass without a failure but is nearly always a
+// mistake: block comments that run past the end of a file (noted as they
+// happen) and regions still open at the end of input.
+class Warnings {
+public:
+    Warnings() : comments_seen_(tplex_comments_past_file_end(nullptr, nullptr)) {}
+
+    // After each sc_next_token.
+    void poll() {
+        tplex_place ended;
+        std::uint32_t opened_line = 0;
+        const std::uint32_t seen = tplex_comments_past_file_end(&ended, &opened_line);
+        if (seen == comments_seen_) return;
+        comments_seen_ = seen;
+        if (opened_line != 0)
+            add(ended.path, opened_line,
+                "/* comment opened here is still open at the end of the file (line " +
+                    std::to_string(ended.line) + ")");
+        else
+            add(ended.path, ended.line, "/* comment still open at the end of the file");
+    }
+
+    // At the end of input.
+    void finish() {
+        tplex_place places[TPLEX_SOURCE_FRAMES + 1];
+        const std::int32_t open = tplex_open_regions(places, TPLEX_SOURCE_FRAMES + 1);
+        for (std::int32_t i = 0; i < open && i <= TPLEX_SOURCE_FRAMES; ++i)
+            add(places[i].path, places[i].line,
+                "#ifdef/#ifndef region still open at the end of input");
+    }
+
+    const std::vector<std::string> &lines() const { return lines_; }
+
+private:
+    void add(const char *path, unsigned long line, const std::string &what) {
+        lines_.push_back(display_path(path) + ":" + std::to_string(line) + ": warning: " + what);
+    }
+
+    std::uint32_t comments_seen_;
+    std::vector<std::string> lines_;
+};
+
+// Failures printed up to the --max-failures limit; the rest only counted.
+class FailureLog {
+public:
+    explicit FailureLog(unsigned long limit) : limit_(limit) {}
+    // Counts a failure; true when it is to be printed.
+    bool admit() { return ++count_ <= limit_ || limit_ == 0; }
+    void add_unprinted() { ++count_; }
+    unsigned long count() const { return count_; }
+    unsigned long hidden() const { return limit_ == 0 || count_ <= limit_ ? 0 : count_ - limit_; }
+    std::string hidden_note() const {
+        return std::to_string(hidden()) + " more failure" + (hidden() == 1 ? "" : "s") +
+               " not shown (--max-failures " + std::to_string(limit_) + ")";
+    }
+
+private:
+    unsigned long limit_;
+    unsigned long count_ = 0;
+};
+
+// Runs sc_next_token to the end of input, or until standard output fails.
+// on_token sees every token (the end of input included), on_failure every
+// failure the log admits, with its diagnostic; warnings, when given, are
+// polled after every call and finished at the end of input.
 template <typename OnToken, typename OnFailure>
-unsigned long lex_all(Session &session, OnToken on_token, OnFailure on_failure) {
+void lex_all(Session &session, FailureLog &log, Warnings *warnings, OnToken on_token,
+             OnFailure on_failure) {
     StuckGuard guard;
-    unsigned long failures = 0;
-    for (;;) {
+    while (std::ferror(stdout) == 0) {
         const status_code r = sc_next_token();
+        if (warnings != nullptr) warnings->poll();
         if (r < 0) {
-            ++failures;
-            std::string file;
-            long line = 0;
-            on_failure(r, file, line);
-            if (!guard.note_failure(r, file, line)) {
-                report_stuck(file, line);
+            if (log.admit()) on_failure(session.diagnose(r), r);
+            if (!guard.note_failure(r, session.file(), session.line())) {
+                report_stuck(session.file(), session.line());
                 break;
             }
             continue;
         }
         guard.note_token();
         on_token(session);
-        if (r == tk_end_of_input) break;
+        if (r == tk_end_of_input) {
+            if (warnings != nullptr) warnings->finish();
+            break;
+        }
     }
-    return failures;
 }
 
 // ---------------------------------------------------------------------------
@@ -284,26 +427,28 @@ std::string token_text(const token_record &t) {
 void print_token(const Session &s, bool json) {
     const token_record &t = s.token();
     const bool has_value = kind_has_value(t.kind);
+    const std::string file = display_path(s.file());
     if (json) {
         std::printf("{\"file\":%s,\"line\":%lu,\"kind\":%u,\"name\":%s,\"value\":%s,\"text\":%s}\n",
-                    json_string(s.file()).c_str(), s.line(), static_cast<unsigned>(t.kind),
+                    json_string(file).c_str(), s.line(), static_cast<unsigned>(t.kind),
                     json_string(kind_name(t.kind)).c_str(),
                     has_value ? std::to_string(t.value).c_str() : "null",
                     json_string(token_text(t)).c_str());
     } else {
-        std::printf("%s:%lu: %-15s %11s %s\n", s.file().c_str(), s.line(),
-                    kind_name(t.kind).c_str(), has_value ? std::to_string(t.value).c_str() : "-",
+        std::printf("%s:%lu: %-15s %11s %s\n", file.c_str(), s.line(), kind_name(t.kind).c_str(),
+                    has_value ? std::to_string(t.value).c_str() : "-",
                     quoted(token_text(t)).c_str());
     }
 }
 
 void print_failure(const Diagnostic &d, status_code code, bool json) {
+    const std::string file = display_path(d.file);
     if (json) {
         std::printf("{\"file\":%s,\"line\":%ld,\"failure\":%s,\"message\":%s,\"source\":%s}\n",
-                    json_string(d.file).c_str(), d.line, json_string(hex_code(code)).c_str(),
+                    json_string(file).c_str(), d.line, json_string(hex_code(code)).c_str(),
                     json_string(d.message).c_str(), json_string(d.source).c_str());
     } else {
-        std::printf("%s:%ld: %-15s %11s %s\n", d.file.c_str(), d.line, "FAILURE",
+        std::printf("%s:%ld: %-15s %11s %s\n", file.c_str(), d.line, "FAILURE",
                     hex_code(code).c_str(), quoted(d.message).c_str());
     }
 }
@@ -312,66 +457,72 @@ int run_tokens(const Options &opt) {
     Session session;
     const int status = session.open(opt);
     if (status >= 0) return status;
-    const unsigned long failures = lex_all(
-        session, [&](const Session &s) { print_token(s, opt.json); },
-        [&](status_code code, std::string &file, long &line) {
-            Diagnostic d = capture_diagnostic(code);
-            // A code shown without a position, or with none to show because
-            // no file is open any more: where the lexer is.
-            if (!d.has_position || d.file.empty()) {
-                d.file = session.file();
-                d.line = static_cast<long>(session.line());
-            }
-            print_failure(d, code, opt.json);
-            file = d.file;
-            line = d.line;
-        });
-    std::fflush(stdout);
-    return failures == 0 ? exit_clean : exit_failures;
+    FailureLog log(opt.max_failures);
+    lex_all(
+        session, log, nullptr, [&](const Session &s) { print_token(s, opt.json); },
+        [&](const Diagnostic &d, status_code code) { print_failure(d, code, opt.json); });
+    // Standard output carries tokens only (one JSON object a line with
+    // --json): the count of the rest goes to standard error.
+    if (log.hidden() > 0) {
+        std::fflush(stdout);
+        std::fprintf(stderr, "%s: %s\n", program, log.hidden_note().c_str());
+    }
+    return log.count() == 0 ? exit_clean : exit_failures;
 }
 
 // ---------------------------------------------------------------------------
 // tplex check and tplex dict
 // ---------------------------------------------------------------------------
 
-// Prints each failure as sg_DisplayError does.
-unsigned long lex_and_display(Session &session) {
-    return lex_all(
-        session, [](const Session &) {},
-        [&](status_code code, std::string &file, long &line) {
-            sg_DisplayError(code);
-            file = session.file();
-            line = static_cast<long>(session.line());
-        });
+// A failure in the form sg_DisplayError prints it, with the tool's path.
+void display_failure(const Diagnostic &d) {
+    std::printf("\nTemplate compiler error :\n%s", d.message.c_str());
+    if (d.has_position)
+        std::printf("\nFile: %s    Line: %ld\n%s%s", display_path(d.file).c_str(), d.line,
+                    d.source.c_str(), d.source.empty() ? "" : "\n");
+}
+
+// Lexes to the end, displaying each failure the log admits, then the count
+// of those it did not.
+void lex_and_display(Session &session, FailureLog &log, Warnings *warnings) {
+    lex_all(
+        session, log, warnings, [](const Session &) {},
+        [](const Diagnostic &d, status_code) { display_failure(d); });
+    if (log.hidden() > 0) std::printf("\n... %s\n", log.hidden_note().c_str());
 }
 
 int run_check(const Options &opt) {
     Session session;
     const int status = session.open(opt);
     if (status >= 0) return status;
-    unsigned long failures = lex_and_display(session);
+    FailureLog log(opt.max_failures);
+    Warnings warnings;
+    lex_and_display(session, log, &warnings);
     // The end of a pass, as the parser ends it.
-    if (dict_check() < 0) ++failures;
-    std::printf("\n%s: %lu failure%s\n", opt.file.c_str(), failures, failures == 1 ? "" : "s");
-    std::fflush(stdout);
-    return failures == 0 ? exit_clean : exit_failures;
+    if (dict_check() < 0) log.add_unprinted();
+    const std::size_t warned = warnings.lines().size();
+    if (warned > 0) std::printf("\n");
+    for (const std::string &line : warnings.lines()) std::printf("%s\n", line.c_str());
+    std::printf("\n%s: %lu failure%s", display_path(opt.file).c_str(), log.count(),
+                log.count() == 1 ? "" : "s");
+    if (warned > 0)
+        std::printf(", %lu warning%s", static_cast<unsigned long>(warned), warned == 1 ? "" : "s");
+    std::printf("\n");
+    if (log.count() > 0 || (opt.strict && warned > 0)) return exit_failures;
+    return exit_clean;
 }
 
 int run_dict(const Options &opt) {
-    // The listing waits for a key every ten lines; with no terminal to
-    // press one on, standard input reads as empty and the wait ends at once.
-    if (!tool_isatty(0) && std::freopen(TOOL_NULL_DEVICE, "r", stdin) == nullptr) {
-        std::fprintf(stderr, "%s: cannot reopen standard input from %s\n", program,
-                     TOOL_NULL_DEVICE);
-        return exit_usage;
-    }
     Session session;
     const int status = session.open(opt);
     if (status >= 0) return status;
-    const unsigned long failures = lex_and_display(session);
-    tplex::dict_list(opt.all ? 1 : 0);
-    std::fflush(stdout);
-    return failures == 0 ? exit_clean : exit_failures;
+    FailureLog log(opt.max_failures);
+    lex_and_display(session, log, nullptr);
+    // The listing waits for a key every ten lines only where someone sees
+    // its prompt and can press one: a prompt in a file or a pipe is noise,
+    // and a wait on a terminal whose output goes elsewhere looks like a hang.
+    tplex_dict_list(opt.all ? 1 : 0, tool_isatty(0) != 0 && tool_isatty(1) != 0);
+    return log.count() == 0 ? exit_clean : exit_failures;
 }
 
 // ---------------------------------------------------------------------------
@@ -380,15 +531,12 @@ int run_dict(const Options &opt) {
 
 int run_table(const Options &opt) {
     // A file that cannot be opened is an I/O error (2), not a damaged table.
-    std::FILE *file = std::fopen(opt.file.c_str(), "rb");
-    if (file == nullptr) {
-        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, opt.file.c_str(),
-                     std::strerror(errno));
+    const std::string reason = open_failure_reason(opt.file);
+    if (!reason.empty()) {
+        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, opt.file.c_str(), reason.c_str());
         return exit_usage;
     }
-    std::fclose(file);
     const int status = tplex::inspect_table_file(opt.file.c_str(), stdout, stderr);
-    std::fflush(stdout);
     return status == 0 ? exit_clean : exit_failures;
 }
 
@@ -402,23 +550,33 @@ const Command commands[] = {
      "operator's TEXT is its spelling. A failure is one line too, with the\n"
      "position, code and message that sg_DisplayError gives:\n"
      "  FILE:LINE: FAILURE 0xd3470207 \"Bad Character\"\n"
-     "and the stream goes on after it, as the lexer allows.\n"
+     "and the stream goes on after it, as the lexer allows. Failures past the\n"
+     "--max-failures limit are counted on standard error.\n"
      "\n"
      "  --json      one JSON object per line instead: {file, line, kind, name,\n"
      "              value, text} for a token, {file, line, failure, message,\n"
-     "              source} for a failure\n",
+     "              source} for a failure. Strings are UTF-8: a byte that is\n"
+     "              not part of well-formed UTF-8 is written as \\udcXX\n"
+     "              (0xDC00 plus the byte), so it can be recovered\n",
      takes_lexing | takes_json, run_tokens},
     {"dict", "dict [--all] [-I DIR]... [-D NAME]... FILE",
-     "Lexes FILE (declaring nothing; failures are printed as sg_DisplayError\n"
-     "prints them), then lists the symbol dictionary: slot, kind, name. The\n"
-     "listing pauses for a key every ten lines when standard input is a terminal.\n"
+     "Lexes FILE (declaring nothing; failures are printed as check prints\n"
+     "them), then lists the symbol dictionary: slot, kind, name. The listing\n"
+     "pauses for a key every ten lines when standard input and standard output\n"
+     "are both terminals, and otherwise runs straight through with no prompt.\n"
      "\n"
      "  --all       list the reserved words and hash words too\n",
      takes_lexing | takes_all, run_dict},
-    {"check", "check [-I DIR]... [-D NAME]... FILE",
-     "Lexes FILE once, as one pass of the compiler would, prints each failure as\n"
-     "sg_DisplayError prints it, then the number of failures.\n",
-     takes_lexing, run_check},
+    {"check", "check [--strict] [-I DIR]... [-D NAME]... FILE",
+     "Lexes FILE once, as one pass of the compiler would, and prints each failure\n"
+     "in the form sg_DisplayError gives it (a failure at the end of input shows\n"
+     "the main file's last line), then warnings, then the number of failures.\n"
+     "Warnings name what the language allows but is nearly always a mistake:\n"
+     "  FILE:LINE: warning: #ifdef/#ifndef region still open at the end of input\n"
+     "  FILE:LINE: warning: /* comment still open at the end of the file\n"
+     "\n"
+     "  --strict    warnings make the exit status 1, as failures do\n",
+     takes_lexing | takes_strict, run_check},
     {"table", "table FILE",
      "Checks a table file written by the table output module, raw or as hex\n"
      "text: the header, the string table and every relocation entry. A sound\n"
@@ -453,8 +611,21 @@ int run(int argc, char **argv) {
     return usage_error(nullptr, "unknown command '" + first + "'");
 }
 
+// Whatever went to standard output must have arrived: a write that failed
+// at any point (a full disk) leaves the stream's error flag set, and the
+// last buffer is only written here.
+int finish_output(int status) {
+    errno = 0;
+    const bool flushed = std::fflush(stdout) == 0;
+    if (flushed && std::ferror(stdout) == 0) return status;
+    std::fprintf(stderr, "%s: cannot write standard output%s%s\n", program,
+                 flushed || errno == 0 ? "" : ": ",
+                 flushed || errno == 0 ? "" : std::strerror(errno));
+    return exit_usage;
+}
+
 }  // namespace tplex::tool
 
 int main(int argc, char **argv) {
-    return tplex::tool::run(argc, argv);
+    return tplex::tool::finish_output(tplex::tool::run(argc, argv));
 }
