@@ -8,8 +8,8 @@
 #include <string>
 #include <vector>
 
+#include "base/memory.h"
 #include "harness_support.h"
-#include "lex/memory.h"
 #include "table_output/output_stream.h"
 #include "table_output/table_check.h"
 #include "tplex/table_output.h"

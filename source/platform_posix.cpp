@@ -13,7 +13,7 @@
 
 #include <cstring>
 
-#include "lex/limits.h"
+#include "base/limits.h"
 #include "source/platform.h"
 
 namespace tplex::platform {

@@ -7,7 +7,7 @@
 #include <cstdint>
 #include <cstdio>
 
-#include "lex/compiler.h"
+#include "base/compiler.h"
 #include "tplex/table_output.h"
 
 namespace tplex {

@@ -5,7 +5,7 @@
 #include <cstdio>
 #include <cstring>
 
-#include "lex/memory.h"
+#include "base/memory.h"
 
 namespace tplex {
 

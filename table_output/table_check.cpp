@@ -4,8 +4,8 @@
 #include <cstdarg>
 #include <cstring>
 
-#include "lex/compiler.h"
-#include "lex/memory.h"
+#include "base/compiler.h"
+#include "base/memory.h"
 #include "table_output/references.h"
 
 namespace tplex {

@@ -24,7 +24,7 @@
 #define TOOL_NULL_DEVICE "/dev/null"
 #endif
 
-#include "scan/listing.h"
+#include "dict/listing.h"
 #include "source/source_stack.h"
 #include "table_output/table_check.h"
 #include "tools/report.h"

@@ -7,8 +7,11 @@
 #include <memory>
 #include <string>
 
-#include "lex/lexer.h"
+#include "base/token.h"
 #include "scan/char_source.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 #include "source/source_stack.h"
 #include "test_support.h"
 

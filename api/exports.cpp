@@ -1,11 +1,14 @@
 // The sixteen exported functions: each hands its call to the subsystem that
 // owns it. Nothing here throws (the library is built without exceptions).
-#include "dict/declarations.h"
+#include "base/token.h"
 #include "dict/dictionary.h"
+#include "dict/keywords.h"
 #include "errors/messages.h"
-#include "lex/keywords.h"
-#include "lex/lexer.h"
+#include "scan/char_source.h"
 #include "scan/directives.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 #include "source/source_stack.h"
 
 extern "C" {

@@ -1,7 +1,7 @@
 // The parser's symbol table services: declaring and checking identifiers
 // with per-class numbering, generated labels, and the undeclared check.
-#ifndef TPLEX_DICT_DECLARATIONS_H
-#define TPLEX_DICT_DECLARATIONS_H
+#ifndef TPLEX_SERVICES_DECLARATIONS_H
+#define TPLEX_SERVICES_DECLARATIONS_H
 
 #include <cstdint>
 
@@ -9,8 +9,16 @@
 
 namespace tplex {
 
+// The declarations' state: the switch the parser holds by address, and
+// the two counters that number declared identifiers.
+extern std::uint8_t declare_enabled;        // parse_ident declares and checks only while 1
 extern std::uint16_t shared_class_counter;  // classes 13, 14, 15, 16, 19, 26
 extern std::uint16_t general_counter;       // every other class
+
+// The counters to their start (a further pass); the switch is the parser's.
+void declarations_reset();
+// The counters to their start and the switch on (a fresh start).
+void declarations_init();
 
 // Reads the next token as an identifier and declares it with class_
 // (declare non-zero) or checks a use of it against class_.

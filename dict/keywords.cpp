@@ -1,136 +1,24 @@
-#include "lex/keywords.h"
+#include "dict/keywords.h"
 
 #include <cstdio>
 
+#include "base/text.h"
 #include "dict/dictionary.h"
+#include "tplex/services.h"
 
 namespace tplex {
 
 namespace {
 
-// The reserved words in code order: code equals index, and the order is
-// part of the interface.
-constexpr const char *reserved_words[reserved_word_count] = {
-    "PROTOCOL",
-    "PROCESS",
-    "STATE",
-    "NEXTSTATE",
-    "INPUT",
-    "UNDEFINED",
-    "OUTPUT",
-    "ALL",
-    "INT",
-    "BIT",
-    "NIBBLE",
-    "BYTE",
-    "TEMPLATE",
-    "TYPE",
-    "MESSAGE",
-    "MATCH",
-    "GENERATE",
-    "BLOCK",
-    "SIGNAL",
-    "SIGNALROUTE",
-    "CONNECT",
-    "ENDBLOCK",
-    "START",
-    "DCL",
-    "ENDPROCESS",
-    "ENDSTATE",
-    "FROM",
-    "ENV",
-    "TO",
-    "WITH",
-    "TASK",
-    "VIA",
-    "AND",
-    "BOOL",
-    "STOP",
-    "UINT",
-    "UBYTE",
-    "OR",
-    "NOT",
-    "<=",
-    ">=",
-    "/=",
-    "TRUE",
-    "FALSE",
-    "XOR",
-    "DECISION",
-    "ELSE",
-    "ENDDECISION",
-    "INMSG",
-    "SEQUENCEVALIDITY",
-    "VALID",
-    "INVALID",
-    "UNKNOWN",
-    "RECORDNUMBER",
-    "PREVIOUSINSEQ",
-    "SELECTCODE",
-    "CHARSTRING",
-    "NOCREATE",
-    "PROCESSKEY",
-    "JOIN",
-    "LINK",
-    "UNLINK",
-    "PID",
-    "SELF",
-    "PARENT",
-    "OFFSPRING",
-    "SENDER",
-    "SET",
-    "ACTIVE",
-    "RESET",
-    "TIMER",
-    "OUTMSG",
-    "USE",
-    "STANDARD",
-    "TIME",
-    "DURATION",
-    "NOW",
-    "TIMESTAMP",
-    "EVENTTYPE",
-    "EVENTSTATUS",
-    "LENGTH",
-    "JAN",
-    "FEB",
-    "MAR",
-    "APR",
-    "MAY",
-    "JUN",
-    "JUL",
-    "AUG",
-    "SEP",
-    "OCT",
-    "NOV",
-    "DEC",
-    "SYSTEM",
-    "CHANNELROUTE",
-    "CONTROL",
-    "LOG",
-    "STREAM",
-    "USERINTERFACE",
-    "ENDCHANNELROUTE",
-    "REFERENCED",
-    "IN",
-    "ON",
-    "PC",
-    "DASS",
-    "ENDSYSTEM",
-    "CALLTRACEID",
-    "DYNAMIC",
-    "STATIC",
-    "FIELD",
-    "VALUE",
-    "POSITION",
-    "MASK",
-    "CRC",
-    "PROTECT",
-    "SOURCE",
-    "HEADER",
-    "WINDOW",
+// The reserved words in code order (the list of tplex/services.h): code
+// equals index, and the order is part of the interface.
+constexpr const char *reserved_words[] = {
+#define TPLEX_RESERVED_WORD_SPELLING(name, spelling) spelling,
+    TPLEX_RESERVED_WORD_LIST(TPLEX_RESERVED_WORD_SPELLING)
+#undef TPLEX_RESERVED_WORD_SPELLING
 };
-static_assert(sizeof reserved_words / sizeof reserved_words[0] == 118);
+static_assert(sizeof reserved_words / sizeof reserved_words[0] == reserved_word_count &&
+              rw_code_count == reserved_word_count);
 
 // The hash words in loading order (not code order).
 struct hash_word {
@@ -152,12 +40,9 @@ constexpr std::array<reserved_word_record, reserved_word_count> make_reserved_ta
     return table;
 }
 
-constexpr bool same_word(const char *a, const char *b) {
-    while (*a != '\0' && *a == *b) ++a, ++b;
-    return *a == *b;
-}
-static_assert(same_word(reserved_words[0], "PROTOCOL") && same_word(reserved_words[39], "<=") &&
-              same_word(reserved_words[117], "WINDOW"));
+static_assert(same_text(reserved_words[rw_protocol], "PROTOCOL") && rw_protocol == 0 &&
+              same_text(reserved_words[rw_less_equal], "<=") && rw_less_equal == 39 &&
+              same_text(reserved_words[rw_window], "WINDOW") && rw_window == 117);
 
 // Inserts one keyword; a word already present is reported and overwritten.
 // Neither the lookup's nor the insert's result is passed on: an insert that

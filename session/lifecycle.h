@@ -1,16 +1,12 @@
-// The lexer's token state and lifecycle: current_token, the two flags the
-// parser sees, initialisation, reset and release of all global state.
-#ifndef TPLEX_LEX_LEXER_H
-#define TPLEX_LEX_LEXER_H
+// The lexer's lifecycle: initialisation, the reset of a further pass and
+// release. Each subsystem creates, resets and releases its own state; this
+// layer only calls them in order.
+#ifndef TPLEX_SESSION_LIFECYCLE_H
+#define TPLEX_SESSION_LIFECYCLE_H
 
-#include "lex/limits.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
-
-extern token_record current_token;  // the token scanned last
-extern uint8_t push_back_flag;      // set by back_token, honoured by scan_token
-extern uint8_t declare_enabled;     // parse_ident declares and checks only while 1
 
 // Allocates the dictionary and both stacks, resets every counter and flag
 // and loads the keywords. 0, or TPLEX_MALLOC_FAILED with nothing kept.
@@ -20,9 +16,8 @@ status_code lex_free();
 // The first half of rewind_input: counters and depths back to their start,
 // the dictionary emptied down to the keywords; the storage is kept.
 void lex_reset();
-
-// Sets push_back_flag.
-void back_token();
+// lex_reset, then closes everything and reopens the main file.
+status_code rewind_input();
 
 }  // namespace tplex
 

@@ -1,16 +1,18 @@
 // The lexer's state: initialisation, reset between passes, release, and the
 // exports called before there is any state.
-#include "lex/lexer.h"
+#include "session/lifecycle.h"
 
 #include <gtest/gtest.h>
 
 #include <string>
 
-#include "dict/declarations.h"
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/keywords.h"
+#include "dict/keywords.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
 #include "source/source_stack.h"
 #include "test_support.h"
 

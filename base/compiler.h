@@ -1,6 +1,6 @@
 // The few compiler attributes the library uses, in one place.
-#ifndef TPLEX_LEX_COMPILER_H
-#define TPLEX_LEX_COMPILER_H
+#ifndef TPLEX_BASE_COMPILER_H
+#define TPLEX_BASE_COMPILER_H
 
 // The per-token path is a handful of small functions; the few that must be
 // inlined into the scan loop, whatever the compiler's own judgement, say so.

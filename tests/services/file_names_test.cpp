@@ -1,5 +1,5 @@
 // File name rules: splitting, the default name and validation.
-#include "source/file_names.h"
+#include "services/file_names.h"
 
 #include <gtest/gtest.h>
 

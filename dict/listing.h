@@ -1,6 +1,6 @@
 // The console listing of the dictionary.
-#ifndef TPLEX_SCAN_LISTING_H
-#define TPLEX_SCAN_LISTING_H
+#ifndef TPLEX_DICT_LISTING_H
+#define TPLEX_DICT_LISTING_H
 
 #include <cstdint>
 

@@ -1,13 +1,13 @@
 // The language's vocabulary: 118 reserved words and 5 hash words. The
 // reserved words are also handed to the parser as a table of records in
 // writable storage.
-#ifndef TPLEX_LEX_KEYWORDS_H
-#define TPLEX_LEX_KEYWORDS_H
+#ifndef TPLEX_DICT_KEYWORDS_H
+#define TPLEX_DICT_KEYWORDS_H
 
 #include <array>
 #include <cstdint>
 
-#include "lex/limits.h"
+#include "base/limits.h"
 #include "tplex/lexer.h"
 
 namespace tplex {

@@ -1,8 +1,9 @@
-#include "scan/string_arg.h"
+#include "services/string_arg.h"
 
-#include "lex/lexer.h"
-#include "lex/text.h"
-#include "scan/directives.h"
+#include "base/limits.h"
+#include "base/text.h"
+#include "base/token.h"
+#include "scan/scanner.h"
 
 namespace tplex {
 

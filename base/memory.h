@@ -1,7 +1,7 @@
 // Heap allocation for the whole library. Every block the library owns comes
 // from here, so a test build can make the n-th allocation fail.
-#ifndef TPLEX_LEX_MEMORY_H
-#define TPLEX_LEX_MEMORY_H
+#ifndef TPLEX_BASE_MEMORY_H
+#define TPLEX_BASE_MEMORY_H
 
 #include <cstddef>
 

@@ -1,4 +1,4 @@
-#include "scan/listing.h"
+#include "dict/listing.h"
 
 #include <cstdio>
 

@@ -1,7 +1,9 @@
-#include "source/file_names.h"
+#include "services/file_names.h"
 
 #include <cstddef>
 #include <cstring>
+
+#include "base/text.h"
 
 namespace tplex {
 
@@ -50,17 +52,6 @@ void copy_cut(char *field, std::size_t cap, const char *src, std::size_t len) {
     field[len] = '\0';
 }
 
-void copy_cut(char *field, std::size_t cap, const char *src) {
-    copy_cut(field, cap, src, std::strlen(src));
-}
-
-// Length of a field's text; more than max when it is longer than max or has
-// no NUL inside the field.
-std::size_t field_length(const char *field, std::size_t cap) {
-    const void *nul = std::memchr(field, '\0', cap);
-    return nul != nullptr ? static_cast<std::size_t>(static_cast<const char *>(nul) - field) : cap;
-}
-
 bool all_chars_allowed(const char *text, std::uint8_t (*bad)(char)) {
     for (; *text != '\0'; ++text) {
         if (bad(*text) != 0) return false;
@@ -78,6 +69,12 @@ std::uint8_t bad_name_char(char c) {
     return (char_classes.of[static_cast<unsigned char>(c)] & in_name) != 0 ? 0 : 1;
 }
 
+}  // namespace tplex
+
+using namespace tplex;  // the helpers above, for the C functions below
+
+extern "C" {
+
 // A null path or expected extension reads as an empty text.
 void split_file_spec(char *path, const char *expected_ext, file_spec *out) {
     if (out == nullptr) return;
@@ -86,8 +83,8 @@ void split_file_spec(char *path, const char *expected_ext, file_spec *out) {
     if (path == nullptr) return;
 
     if (std::strcmp(path, "$") == 0) {
-        copy_cut(out->name_part, sizeof out->name_part, path);
-        copy_cut(out->ext_part, sizeof out->ext_part, expected_ext);
+        copy_text(out->name_part, sizeof out->name_part, path);
+        copy_text(out->ext_part, sizeof out->ext_part, expected_ext);
         return;
     }
 
@@ -111,7 +108,7 @@ void split_file_spec(char *path, const char *expected_ext, file_spec *out) {
     if (std::strcmp(found_ext, expected_ext) == 0) {
         std::size_t name_len = dot != nullptr ? static_cast<std::size_t>(dot - path) : len;
         copy_cut(out->name_part, sizeof out->name_part, path, name_len);
-        copy_cut(out->ext_part, sizeof out->ext_part, expected_ext);
+        copy_text(out->ext_part, sizeof out->ext_part, expected_ext);
     } else {
         copy_cut(out->name_part, sizeof out->name_part, path, len);
     }
@@ -121,16 +118,16 @@ void split_file_spec(char *path, const char *expected_ext, file_spec *out) {
 void apply_default_name(file_spec *parts, const char *name) {
     if (parts == nullptr || name == nullptr) return;
     if (std::strcmp(parts->name_part, "$") == 0)
-        copy_cut(parts->name_part, sizeof parts->name_part, name);
+        copy_text(parts->name_part, sizeof parts->name_part, name);
 }
 
 // A field without a NUL inside it (a record filled by hand) counts as too
 // long, so nothing is read past a field.
-std::uint8_t file_spec_invalid(const file_spec *parts) {
+uint8_t file_spec_invalid(const file_spec *parts) {
     if (parts == nullptr) return 1;
-    const std::size_t dir_len = field_length(parts->dir_part, sizeof parts->dir_part);
-    const std::size_t name_len = field_length(parts->name_part, sizeof parts->name_part);
-    const std::size_t ext_len = field_length(parts->ext_part, sizeof parts->ext_part);
+    const std::size_t dir_len = text_length(parts->dir_part, sizeof parts->dir_part);
+    const std::size_t name_len = text_length(parts->name_part, sizeof parts->name_part);
+    const std::size_t ext_len = text_length(parts->ext_part, sizeof parts->ext_part);
     if (dir_len > spec_dir_max || name_len > spec_name_max || ext_len > spec_ext_max) return 1;
     if (name_len == 0 && dir_len != 0) return 1;
     if (!all_chars_allowed(parts->dir_part, bad_dir_char)) return 1;
@@ -139,4 +136,4 @@ std::uint8_t file_spec_invalid(const file_spec *parts) {
     return 0;
 }
 
-}  // namespace tplex
+}  // extern "C"

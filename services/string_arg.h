@@ -1,6 +1,6 @@
 // The reader of string arguments.
-#ifndef TPLEX_SCAN_STRING_ARG_H
-#define TPLEX_SCAN_STRING_ARG_H
+#ifndef TPLEX_SERVICES_STRING_ARG_H
+#define TPLEX_SERVICES_STRING_ARG_H
 
 #include <cstdint>
 

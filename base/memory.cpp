@@ -1,4 +1,4 @@
-#include "lex/memory.h"
+#include "base/memory.h"
 
 #include <cstdlib>
 

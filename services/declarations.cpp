@@ -1,15 +1,26 @@
-#include "dict/declarations.h"
+#include "services/declarations.h"
 
 #include <cstdio>
 
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/lexer.h"
-#include "scan/directives.h"
+#include "scan/scanner.h"
 
 namespace tplex {
 
+std::uint8_t declare_enabled = 1;
 std::uint16_t shared_class_counter = 0;
 std::uint16_t general_counter = 1;
+
+void declarations_reset() {
+    shared_class_counter = 0;
+    general_counter = 1;
+}
+
+void declarations_init() {
+    declare_enabled = 1;
+    declarations_reset();
+}
 
 namespace {
 

@@ -1,6 +1,6 @@
 // The dictionary listing, byte for byte, with its key-press pauses fed from
 // a file on standard input.
-#include "scan/listing.h"
+#include "dict/listing.h"
 
 #include <gtest/gtest.h>
 #include <unistd.h>
@@ -8,9 +8,12 @@
 #include <cstdio>
 #include <string>
 
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/lexer.h"
 #include "lex_harness.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 
 using tplex::test::CaptureStdout;
 using tplex::test::LexSession;

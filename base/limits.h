@@ -1,6 +1,8 @@
 // The library's fixed sizes. A limit reached is a status code, never growth.
-#ifndef TPLEX_LEX_LIMITS_H
-#define TPLEX_LEX_LIMITS_H
+#ifndef TPLEX_BASE_LIMITS_H
+#define TPLEX_BASE_LIMITS_H
+
+#include <cstddef>
 
 #include "tplex/lexer.h"
 
@@ -19,6 +21,10 @@ inline constexpr int max_cond_depth = cond_flag_count - 1;
 inline constexpr int include_dir_entries = 10;  // of which 9 are ever filled
 inline constexpr int include_dir_size = 255;    // 254 characters + NUL
 inline constexpr int join_buffer_size = 2500;   // directory + "\" + name
+// The scanner and the dictionary look at 16 bytes at a time: every buffer
+// they read that way (a source line, a macro body, a word in the token's
+// text) is followed by this many readable bytes from its NUL on.
+inline constexpr std::size_t read_slack = 16;
 inline constexpr int reserved_word_count = TPLEX_RESERVED_WORDS;
 inline constexpr int hash_word_count = TPLEX_HASH_WORDS;
 
