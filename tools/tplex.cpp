@@ -24,11 +24,10 @@
 #define TOOL_NULL_DEVICE "/dev/null"
 #endif
 
-#include "dict/listing.h"
-#include "source/source_stack.h"
-#include "table_output/table_check.h"
-#include "tools/report.h"
+#include "report.h"
 #include "tplex/lexer.h"
+#include "tplex/services.h"
+#include "tplex/table_output.h"
 
 namespace tplex::tool {
 namespace {
@@ -185,7 +184,7 @@ public:
         if (opened < 0) return io_error("cannot open " + opt.file, opened);
         main_file_ = opt.file;
         for (const std::string &dir : opt.include_dirs) {
-            const status_code added = tplex::add_include_dir(dir.c_str());
+            const status_code added = ::add_include_dir(dir.c_str());
             if (added < 0) return io_error("-I " + dir, added);
         }
         return -1;
@@ -203,7 +202,7 @@ public:
 
 private:
     int io_error(const std::string &what, status_code code) {
-        const Diagnostic d = capture_diagnostic(code);
+        const Diagnostic d = diagnostic_of(code);
         std::fprintf(stderr, "%s: %s: %s\n", program, what.c_str(), d.message.c_str());
         return exit_usage;
     }
@@ -315,7 +314,7 @@ int run_tokens(const Options &opt) {
     const unsigned long failures = lex_all(
         session, [&](const Session &s) { print_token(s, opt.json); },
         [&](status_code code, std::string &file, long &line) {
-            Diagnostic d = capture_diagnostic(code);
+            Diagnostic d = diagnostic_of(code);
             // A code shown without a position, or with none to show because
             // no file is open any more: where the lexer is.
             if (!d.has_position || d.file.empty()) {
@@ -369,7 +368,7 @@ int run_dict(const Options &opt) {
     const int status = session.open(opt);
     if (status >= 0) return status;
     const unsigned long failures = lex_and_display(session);
-    tplex::dict_list(opt.all ? 1 : 0);
+    ::dict_list(opt.all ? 1 : 0);
     std::fflush(stdout);
     return failures == 0 ? exit_clean : exit_failures;
 }
@@ -378,18 +377,41 @@ int run_dict(const Options &opt) {
 // tplex table
 // ---------------------------------------------------------------------------
 
+// The whole of a file, or false when it cannot be read.
+bool read_file(std::FILE *file, std::vector<std::uint8_t> &data) {
+    std::uint8_t block[4096];
+    std::size_t n;
+    while ((n = std::fread(block, 1, sizeof block, file)) > 0)
+        data.insert(data.end(), block, block + n);
+    return std::ferror(file) == 0;
+}
+
 int run_table(const Options &opt) {
     // A file that cannot be opened is an I/O error (2), not a damaged table.
-    std::FILE *file = std::fopen(opt.file.c_str(), "rb");
+    const char *path = opt.file.c_str();
+    std::FILE *file = std::fopen(path, "rb");
     if (file == nullptr) {
-        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, opt.file.c_str(),
-                     std::strerror(errno));
+        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, path, std::strerror(errno));
         return exit_usage;
     }
+    std::vector<std::uint8_t> data;
+    const bool read = read_file(file, data);
     std::fclose(file);
-    const int status = tplex::inspect_table_file(opt.file.c_str(), stdout, stderr);
+    if (!read) {
+        std::fprintf(stderr, "tplex table: cannot read '%s'\n", path);
+        return exit_failures;
+    }
+    table_check check{};
+    const bool sound = CheckTable(data.data(), data.size(), &check) != 0;
+    if (sound) {
+        std::printf("file: %s\n", path);
+        print_table_summary(check, stdout);
+    } else {
+        std::fprintf(stderr, "tplex table: %s: %s\n", path, check.error);
+    }
+    ReleaseTableCheck(&check);
     std::fflush(stdout);
-    return status == 0 ? exit_clean : exit_failures;
+    return sound ? exit_clean : exit_failures;
 }
 
 // ---------------------------------------------------------------------------
