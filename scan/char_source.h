@@ -32,7 +32,9 @@ struct macro_frame {
     char body[text_size + read_slack];  // the NUL is followed by zero bytes
 };
 
-// The character source's state: the macro stack and the cursor.
+// The character source's state: the macro stack and the cursor. Of the
+// source stack's frames it writes only read_pos, its cursor's place in a
+// line, kept in the frame because the parser reads it there.
 extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1
 extern std::uint16_t macro_depth;
 
