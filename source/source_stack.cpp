@@ -19,8 +19,8 @@ int32_t include_dir_count = 0;
 
 namespace {
 
-// The scanner looks at 16 bytes at a time from a line's NUL on: the last
-// frame's line is followed by its file handle and the read slack.
+// The scanner reads up to read_slack bytes past a line's NUL: the last
+// frame's line is followed by its file handle and that slack.
 constexpr std::size_t source_stack_bytes = sizeof(source_frame) * source_frame_count + read_slack;
 
 // Length of text when it has at most limit characters, else limit + 1;
