@@ -1,8 +1,9 @@
 /*
  * tplex parser services: the operations a parser has beyond the sixteen
- * exports, for a parser that links the static archive (libtplex.a, CMake
- * target tplex::tplex_static, pkg-config --static). The shared library and
- * the DLL do not export them.
+ * exports, for a parser that links the static archive: libtplex.a, the CMake
+ * target tplex::tplex_static, or by hand
+ *   cc -DTPLEX_STATIC ... -Wl,-Bstatic $(pkg-config --static --libs tplex) -Wl,-Bdynamic
+ * The shared library and the DLL do not export them.
  *
  * Plain C99, usable from C and C++. The same rules as tplex/lexer.h: every
  * operation runs on the one lexer state of the process, between sc_lex_init
