@@ -37,8 +37,8 @@ elseif(CMAKE_SYSTEM_NAME STREQUAL "Linux")
   # Belt and braces behind hidden visibility: the version script names the
   # exports, so nothing else can leak into the dynamic symbol table.
   target_link_options(tplex PRIVATE
-    "LINKER:--version-script=${PROJECT_SOURCE_DIR}/lex/exports.map"
+    "LINKER:--version-script=${PROJECT_SOURCE_DIR}/api/exports.map"
     "LINKER:--no-undefined")
   set_property(TARGET tplex APPEND PROPERTY LINK_DEPENDS
-    ${PROJECT_SOURCE_DIR}/lex/exports.map)
+    ${PROJECT_SOURCE_DIR}/api/exports.map)
 endif()

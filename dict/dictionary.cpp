@@ -1,22 +1,35 @@
 #include "dict/dictionary.h"
 
+#include <array>
 #include <cstring>
 
 #if defined(__SSE2__)
 #include <emmintrin.h>
 #endif
 
-#include "lex/compiler.h"
-#include "lex/lexer.h"
-#include "lex/memory.h"
-#include "lex/text.h"
+#include "base/compiler.h"
+#include "base/memory.h"
+#include "base/text.h"
+#include "base/token.h"
 
 namespace tplex {
 
 dict_entry **dict_slots = nullptr;
-std::uint16_t hash_weights[word_max];
 
 namespace {
+
+// The hash weight of the character d places before a name's last one: 64,
+// 32, 16, 8, 4, 2, 1, repeated.
+constexpr std::uint16_t hash_weight(int d) {
+    return static_cast<std::uint16_t>(64 >> (d % 7));
+}
+
+constexpr std::array<std::uint16_t, word_max> make_hash_weights() {
+    std::array<std::uint16_t, word_max> t{};
+    for (int d = 0; d < word_max; ++d) t[d] = hash_weight(d);
+    return t;
+}
+constexpr std::array<std::uint16_t, word_max> hash_weights = make_hash_weights();
 
 constexpr std::uint16_t no_slot = 0xFFFF;
 
@@ -59,10 +72,10 @@ constexpr chunk_weights make_chunk_weights() {
     chunk_weights t{};
     for (int m = 0; m < 7; ++m)
         for (int i = 0; i < 16; ++i)
-            t.row[m][i] = static_cast<std::int16_t>(64 >> (((m - i) % 7 + 7) % 7));
+            t.row[m][i] = static_cast<std::int16_t>(hash_weight(((m - i) % 7 + 7) % 7));
     int sum = 0;
     for (int n = 1; n <= word_max; ++n) {
-        sum += 64 >> ((n - 1) % 7);
+        sum += hash_weight(n - 1);
         t.bias[n] = static_cast<std::uint16_t>(48 * sum + 17 * 64);
     }
     return t;
@@ -181,10 +194,6 @@ void release_entry(dict_entry *e) {
 }
 
 }  // namespace
-
-void fill_hash_weights() {
-    for (int d = 0; d < word_max; ++d) hash_weights[d] = static_cast<std::uint16_t>(64 >> (d % 7));
-}
 
 std::uint16_t dict_hash(const char *name) {
     return static_cast<std::uint16_t>(hash_key(name, key_length(name)) % dict_slot_count);

@@ -8,7 +8,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "lex/limits.h"
+#include "base/limits.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
@@ -36,11 +36,8 @@ struct dict_entry {
     std::uint8_t length;          // characters in name
 };
 
-extern dict_entry **dict_slots;  // dict_slot_count slots; null before lex_initialise
-extern std::uint16_t hash_weights[word_max];
-
-// Fills hash_weights: 64, 32, 16, 8, 4, 2, 1, repeated.
-void fill_hash_weights();
+// The dictionary's state: dict_slot_count slots, null before dict_create.
+extern dict_entry **dict_slots;
 
 // The home slot of an upper-case name. Only its first 128 characters count:
 // a longer name is stored, hashed and compared as those 128.
@@ -56,7 +53,7 @@ void dict_upcase(char *name);
 status_code dict_lookup(char *name);
 // The scanner's lookup of current_token.text, which it has already
 // upper-cased, whose length (at most 128) it knows, whose characters are
-// ASCII, and which it has followed with 16 zero bytes. Same results as
+// ASCII, and which it has followed with read_slack zero bytes. Same results as
 // dict_lookup.
 status_code dict_lookup_token(std::size_t length);
 
@@ -77,7 +74,8 @@ void dict_set_kind(std::uint8_t kind, std::int16_t code);
 status_code dict_extend(const char *text1, const char *text2, const char *text3, std::uint8_t flag1,
                         std::uint8_t flag2, std::uint8_t flag3);
 
-// Lifecycle, run by lex_initialise, the reset and lex_free.
+// Lifecycle: create allocates the empty slots (0 or TPLEX_MALLOC_FAILED),
+// clear empties them (the reset), destroy releases them.
 status_code dict_create();
 void dict_clear();
 void dict_destroy();

@@ -5,8 +5,10 @@
 #include <cstdint>
 #include <cstdio>
 
-#include "lex/limits.h"
+#include "base/limits.h"
+#include "base/text.h"
 #include "source/source_stack.h"
+#include "tplex/services.h"
 
 namespace tplex {
 
@@ -73,11 +75,6 @@ constexpr const char *messages[] = {
     "Not an allowed field not present statement",                // D3470232
 };
 
-constexpr bool same_text(const char *a, const char *b) {
-    while (*a != '\0' && *a == *b) ++a, ++b;
-    return *a == *b;
-}
-
 static_assert(sizeof messages / sizeof messages[0] == slot_count, "50 slots");
 static_assert(same_text(messages[slot_of(TPLEX_GENERAL_FAILURE)], "General Failure Code"),
               "first slot");
@@ -95,7 +92,24 @@ static_assert(same_text(messages[slot_of(TPLEX_FIELD_NOT_PRESENT)],
 static_assert(slot_of(TPLEX_STATUS(0xD3470200u)) >= slot_count && slot_of(0) >= slot_count,
               "codes below the catalogue wrap past its end");
 
+constexpr const char *heading = "\nTemplate compiler error :\n";
 constexpr const char *close_failed_line = "Error Closing File\n";
+
+// The longest message: the catalogue's, or an unlisted code's.
+constexpr std::size_t longest_message() {
+    std::size_t longest = sizeof "unspecified error: ffffffff" - 1;
+    for (const char *m : messages) {
+        std::size_t n = 0;
+        while (m != nullptr && m[n] != '\0') ++n;
+        if (n > longest) longest = n;
+    }
+    return longest;
+}
+static_assert(sizeof "\nTemplate compiler error :\n" - 1 + longest_message() +
+                      sizeof "\nFile:     Line: -2147483648\n" - 1 + (path_size - 1) +
+                      (line_size - 1) + 1 <=
+                  TPLEX_DIAGNOSTIC_SIZE,
+              "a diagnostic fits TPLEX_DIAGNOSTIC_SIZE");
 constexpr const char *unlisted_sentence = "Unspecified error. The Parser is now very confused.";
 
 // The frame whose position a diagnostic shows: the current one, or frame 0
@@ -116,26 +130,34 @@ const char *status_text(status_code code) {
 // Before the stack exists the position reads as an empty path, line 0 and
 // an empty line. Path and line are printed with a precision of their field
 // size, so a field that a caller left without its NUL is not read past.
-void display_error(status_code code) {
-    std::printf("\nTemplate compiler error :\n");
+std::size_t format_diagnostic(status_code code, char *buffer, std::size_t size) {
+    int n;
     if (code == TPLEX_CLOSE_FAILED) {
-        std::printf("%s", close_failed_line);
-        std::fflush(stdout);
-        return;
-    }
-    if (const char *text = status_text(code)) {
-        std::printf("%s", text);
+        n = std::snprintf(buffer, size, "%s%s", heading, close_failed_line);
     } else {
-        std::printf("unspecified error: %x", static_cast<unsigned>(code));
+        const char *text = status_text(code);
+        char unlisted[32];
+        if (text == nullptr) {
+            std::snprintf(unlisted, sizeof unlisted, "unspecified error: %x",
+                          static_cast<unsigned>(code));
+            text = unlisted;
+        }
+        const source_frame *frame = reported_frame();
+        const char *path = frame != nullptr ? frame->path : "";
+        const char *line = frame != nullptr ? frame->line_text : "";
+        static_assert(no_line_yet + 1u == 0u, "no line yet reads as line 0");
+        const std::uint32_t line_no = frame != nullptr ? frame->line_no + 1u : 0u;
+        n = std::snprintf(buffer, size, "%s%s\nFile: %.*s    Line: %d\n%.*s", heading, text,
+                          path_size - 1, path, static_cast<int>(static_cast<std::int32_t>(line_no)),
+                          line_size - 1, line);
     }
-    const source_frame *frame = reported_frame();
-    const char *path = frame != nullptr ? frame->path : "";
-    const char *line = frame != nullptr ? frame->line_text : "";
-    // The line counter is all ones before a file's first line: line 0.
-    const std::uint32_t line_no = frame != nullptr ? frame->line_no + 1u : 0u;
-    std::printf("\nFile: %.*s    Line: %d\n", path_size - 1, path,
-                static_cast<int>(static_cast<std::int32_t>(line_no)));
-    std::printf("%.*s", line_size - 1, line);
+    return n > 0 ? static_cast<std::size_t>(n) : 0;
+}
+
+void display_error(status_code code) {
+    char text[TPLEX_DIAGNOSTIC_SIZE];
+    const std::size_t n = format_diagnostic(code, text, sizeof text);
+    std::fwrite(text, 1, n < sizeof text ? n : sizeof text - 1, stdout);
     std::fflush(stdout);
 }
 

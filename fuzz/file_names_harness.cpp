@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "harness_support.h"
-#include "source/file_names.h"
+#include "services/file_names.h"
 
 namespace tplex::fuzz {
 

@@ -6,13 +6,15 @@
 #include <string>
 #include <vector>
 
-#include "dict/declarations.h"
+#include "base/memory.h"
+#include "base/token.h"
 #include "harness_support.h"
-#include "lex/lexer.h"
-#include "lex/memory.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
-#include "scan/string_arg.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "services/string_arg.h"
+#include "session/lifecycle.h"
 #include "source/source_stack.h"
 #include "tplex/lexer.h"
 

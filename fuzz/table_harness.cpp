@@ -8,10 +8,9 @@
 #include <string>
 #include <vector>
 
+#include "base/memory.h"
 #include "harness_support.h"
-#include "lex/memory.h"
 #include "table_output/output_stream.h"
-#include "table_output/table_check.h"
 #include "tplex/table_output.h"
 
 namespace tplex::fuzz {
@@ -44,17 +43,17 @@ std::string read_all(const char *name) {
 
 // The checker's walk of a table it accepted: every entry and string lies
 // inside the table.
-void walk_sound_table(const TableCheck &check) {
+void walk_sound_table(const table_check &check) {
     TPLEX_FUZZ_CHECK(check.relocation_offset <= check.size, check.relocation_offset);
     TPLEX_FUZZ_CHECK(
         std::uint64_t{check.relocation_count} * 8 <= check.size - check.relocation_offset,
         check.relocation_count);
     for (std::uint32_t i = 0; i < check.relocation_count; ++i) {
-        const TableRelocation r = table_relocation(check, i);
+        const table_relocation r = TableRelocationAt(&check, i);
         TPLEX_FUZZ_CHECK(r.location < check.relocation_offset, r.location);
         TPLEX_FUZZ_CHECK(r.target < check.relocation_offset, r.target);
         if (!r.is_string) continue;
-        const char *s = table_string(check, r.target);
+        const char *s = TableStringAt(&check, r.target);
         TPLEX_FUZZ_CHECK(std::memchr(s, 0, check.size - r.target) != nullptr, r.target);
     }
 }
@@ -114,16 +113,16 @@ void close_output(output_model &m) {
     if (tracing)
         std::fprintf(stderr, "table file of %zu bytes:\n%.*s\n", data.size(),
                      static_cast<int>(data.size() < 400 ? data.size() : 400), data.c_str());
-    TableCheck check{};
+    table_check check{};
     const bool sound =
-        check_table(reinterpret_cast<const std::uint8_t *>(data.data()), data.size(), check);
+        CheckTable(reinterpret_cast<const std::uint8_t *>(data.data()), data.size(), &check);
     if (!sound) std::fprintf(stderr, "table checker: %s\n", check.error);
     TPLEX_FUZZ_CHECK(sound, data.size());
     TPLEX_FUZZ_CHECK(check.hex_text == ((m.flags & TPLEX_OUT_HEX_TEXT) != 0), check.hex_text);
     TPLEX_FUZZ_CHECK(check.tag == (m.tag == 0 ? 1 : m.tag), check.tag);
     TPLEX_FUZZ_CHECK(check.relocation_count == m.uses, check.relocation_count);
     walk_sound_table(check);
-    release_table_check(check);
+    ReleaseTableCheck(&check);
 }
 
 void abandon_output(output_model &m, std::uint32_t free_tables) {
@@ -302,16 +301,14 @@ void run_table_output(const std::uint8_t *data, std::size_t size) {
 void run_table_check(const std::uint8_t *data, std::size_t size) {
     // An exact copy on the heap: a read past the end is caught.
     std::vector<std::uint8_t> bytes(data, data + size);
-    TableCheck check{};
-    if (check_table(bytes.data(), bytes.size(), check)) {
+    table_check check{};
+    if (CheckTable(bytes.data(), bytes.size(), &check)) {
         walk_sound_table(check);
-        static std::FILE *sink = std::fopen("/dev/null", "w");
-        if (sink != nullptr) print_table_summary(check, sink);
     } else {
         TPLEX_FUZZ_CHECK(check.error[0] != '\0', 0);
         TPLEX_FUZZ_CHECK(terminated(check.error, sizeof check.error), 0);
     }
-    release_table_check(check);
+    ReleaseTableCheck(&check);
 }
 
 }  // namespace tplex::fuzz

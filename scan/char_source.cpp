@@ -2,9 +2,9 @@
 
 #include <cstring>
 
-#include "lex/text.h"
+#include "base/memory.h"
+#include "base/text.h"
 #include "scan/pass_facts.h"
-#include "source/platform.h"
 #include "source/source_stack.h"
 
 namespace tplex {
@@ -14,18 +14,18 @@ std::uint16_t macro_depth = 0;
 
 namespace {
 
-constexpr std::uint32_t no_line = 0xFFFFFFFFu;
+const unsigned char end_of_buffer[read_slack] = {0};  // a buffer with nothing left
 
-// The buffer read_cursor points into, so its position can be stored back.
-enum class cursor_owner : std::uint8_t { none, macro, file };
+}  // namespace
 
-const unsigned char end_of_buffer[16] = {0};  // a buffer with nothing left
+cursor_origin cursor_from{cursor_owner::none, 0, end_of_buffer};
+const unsigned char *read_cursor = end_of_buffer;
+const unsigned char *cursor_line = end_of_buffer;
+std::uint16_t *cursor_line_pos = nullptr;
 
-struct cursor_state {
-    cursor_owner owner = cursor_owner::none;
-    int index = 0;  // macro frame index, or source depth
-    const unsigned char *base = end_of_buffer;
-} cur;
+namespace {
+
+cursor_origin &cur = cursor_from;
 
 void store_position() {
     switch (cur.owner) {
@@ -74,16 +74,20 @@ inline std::uint8_t line_char(const source_frame &f) {
 
 }  // namespace
 
-const unsigned char *read_cursor = end_of_buffer;
-const unsigned char *cursor_line = end_of_buffer;
-std::uint16_t *cursor_line_pos = nullptr;
+status_code char_source_create() {
+    macro_stack = static_cast<macro_frame *>(mem_alloc(sizeof(macro_frame) * macro_frame_count));
+    return macro_stack != nullptr ? 0 : TPLEX_MALLOC_FAILED;
+}
+
+void char_source_destroy() {
+    drop_cursor();
+    mem_free(macro_stack);
+    macro_stack = nullptr;
+    macro_depth = 0;
+}
 
 void char_source_sync() {
     store_position();
-    drop_cursor();
-}
-
-void char_source_forget() {
     drop_cursor();
 }
 
@@ -98,8 +102,7 @@ std::uint8_t read_char_slow() {
     // one) and the file has another line.
     if (cursor_line_pos != nullptr) {
         source_frame &f = source_stack[cur.index];
-        if (platform::read_line(f.file, f.line_text, line_size)) {
-            ++f.line_no;
+        if (read_next_line(f)) {
             const auto c = static_cast<std::uint8_t>(f.line_text[0]);
             if (c != 0) {
                 f.read_pos = 1;
@@ -127,18 +130,14 @@ std::uint8_t read_char_slow() {
 
     source_frame *f = current_frame();
     if (f == nullptr) return ch_end_of_input;
-    if (f->line_no == no_line || line_char(*f) == 0) {
+    if (f->line_no == no_line_yet || line_char(*f) == 0) {
         // A file that has no more lines is closed and the includer goes on
         // with its next line.
-        while (!platform::read_line(f->file, f->line_text, line_size)) {
+        while (!read_next_line(*f)) {
             note_file_end(*f);
-            if (f->file != nullptr) platform::close_source(f->file);
-            f->file = nullptr;
-            --source_depth;
-            f = current_frame();
+            f = pop_source_file();
             if (f == nullptr) return ch_end_of_input;
         }
-        ++f->line_no;
         f->read_pos = 0;
     }
     const std::uint8_t c = line_char(*f);
@@ -168,8 +167,18 @@ status_code push_macro(const char *body) {
     ++macro_depth;
     m.read_pos = 0;
     m.length = static_cast<std::uint32_t>(copy_text(m.body, text_size, body));
-    std::memset(m.body + m.length, 0, 16);  // scanned 16 bytes at a time
+    std::memset(m.body + m.length, 0, read_slack);
     return 0;
+}
+
+status_code open_source_file(const char *name) {
+    char_source_sync();
+    return push_source_file(name);
+}
+
+status_code close_sources() {
+    char_source_sync();
+    return close_source_files();
 }
 
 }  // namespace tplex

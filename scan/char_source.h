@@ -12,7 +12,7 @@
 
 #include <cstdint>
 
-#include "lex/limits.h"
+#include "base/limits.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
@@ -27,14 +27,25 @@ inline constexpr std::uint8_t ch_end_of_input = 255;
 // One pending macro body. The read position is wider than a byte, so a body
 // of any length that fits (up to 2499 characters) is read to its end.
 struct macro_frame {
-    std::uint32_t read_pos;     // next character of body
-    std::uint32_t length;       // characters in body before its NUL
-    char body[text_size + 16];  // the NUL is followed by 15 more zero bytes
+    std::uint32_t read_pos;             // next character of body
+    std::uint32_t length;               // characters in body before its NUL
+    char body[text_size + read_slack];  // the NUL is followed by zero bytes
 };
 
+// The character source's state: the macro stack and the cursor. Of the
+// source stack's frames it writes only read_pos, its cursor's place in a
+// line, kept in the frame because the parser reads it there.
 extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1
 extern std::uint16_t macro_depth;
 
+// The buffer read_cursor points into, so its position can be stored back.
+enum class cursor_owner : std::uint8_t { none, macro, file };
+struct cursor_origin {
+    cursor_owner owner;
+    int index;  // macro frame index, or source depth
+    const unsigned char *base;
+};
+extern cursor_origin cursor_from;
 extern const unsigned char *read_cursor;
 // While the cursor reads a file's line: that line, and its frame's read_pos
 // (null otherwise), so the position can be stored back cheaply.
@@ -81,6 +92,12 @@ inline std::uint8_t next_char() {
     return c;
 }
 
+// Allocates the macro stack: 0 or TPLEX_MALLOC_FAILED.
+status_code char_source_create();
+// The stacks' storage is going away: drops the cursor without storing it
+// and releases the macro stack.
+void char_source_destroy();
+
 // Pushes a body (at most 2499 characters are kept). 0, or
 // TPLEX_TOO_MANY_MACRO_LEVELS with the stack unchanged.
 status_code push_macro(const char *body);
@@ -89,8 +106,14 @@ status_code push_macro(const char *body);
 // source: store the read position into its frame and derive it again from
 // the stacks on the next read.
 void char_source_sync();
-// Abandons every pending body: reading goes on in the current file.
+// Abandons every pending body: reading goes on in the current file. This
+// is also the character source's reset.
 void drop_macros();
+
+// The source stack's open and close, with the cursor stored first and
+// derived again afterwards: what every reader above calls.
+status_code open_source_file(const char *name);
+status_code close_sources();
 
 // Stores the read position into its source frame; the cursor stays where
 // it is. (A macro frame's position is internal and stored when needed.)
@@ -98,8 +121,6 @@ inline void char_source_store() {
     if (cursor_line_pos != nullptr)
         *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
 }
-// The stacks' storage is going away: drop the cursor without storing.
-void char_source_forget();
 
 }  // namespace tplex
 

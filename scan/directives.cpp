@@ -3,19 +3,23 @@
 #include <cstdio>
 #include <cstring>
 
+#include "base/memory.h"
+#include "base/text.h"
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/lexer.h"
-#include "lex/memory.h"
-#include "lex/text.h"
 #include "scan/char_source.h"
 #include "scan/pass_facts.h"
 #include "scan/scanner.h"
-#include "source/source_stack.h"
 
 namespace tplex {
 
 std::uint8_t cond_stack[cond_flag_count] = {1};
 std::uint16_t cond_depth = 0;
+
+void directives_reset() {
+    cond_depth = 0;
+    cond_stack[0] = 1;
+}
 
 namespace {
 

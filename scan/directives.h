@@ -5,7 +5,7 @@
 
 #include <cstdint>
 
-#include "lex/limits.h"
+#include "base/limits.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
@@ -20,10 +20,8 @@ inline bool region_live() {
     return cond_stack[cond_depth] == 1;
 }
 
-// The next token the parser gets (scan/scanner.cpp, where the filter loop
-// runs over the scanner): its kind, or a failure code. The next call goes on
-// after the point where a failure happened.
-status_code next_token_filtered();
+// Region 0 only, live: the directives' reset.
+void directives_reset();
 // Runs the hash word in current_token (its code in value). 0 or more to go
 // on, or a failure code.
 status_code process_hash_directive();

@@ -2,12 +2,10 @@
 
 #include <cstring>
 
-#include "lex/text.h"
+#include "base/text.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
-#include "scan/listing.h"
 #include "source/source_stack.h"
-#include "tplex/tool_queries.h"
 
 namespace tplex {
 
@@ -62,25 +60,17 @@ void note_file_end(const source_frame &f) {
     comment.opened_line = began_here ? comment.line : 0u;
 }
 
-}  // namespace tplex
-
-extern "C" {
-
-int32_t tplex_open_regions(tplex_place *places, int32_t capacity) {
-    const int32_t open = tplex::cond_depth;
-    for (int32_t i = 0; places != nullptr && i < open && i < capacity; ++i)
-        places[i] = tplex::region_places[i + 1];
+std::int32_t open_regions(tplex_place *places, std::int32_t capacity) {
+    const std::int32_t open = cond_depth;
+    for (std::int32_t i = 0; places != nullptr && i < open && i < capacity; ++i)
+        places[i] = region_places[i + 1];
     return open;
 }
 
-uint32_t tplex_comments_past_file_end(tplex_place *ended, uint32_t *opened_line) {
-    if (ended != nullptr) *ended = tplex::comment.ended;
-    if (opened_line != nullptr) *opened_line = tplex::comment.opened_line;
-    return tplex::comment.past_end;
+std::uint32_t comments_past_file_end(tplex_place *ended, std::uint32_t *opened_line) {
+    if (ended != nullptr) *ended = comment.ended;
+    if (opened_line != nullptr) *opened_line = comment.opened_line;
+    return comment.past_end;
 }
 
-void tplex_dict_list(uint8_t all, int pause) {
-    tplex::list_dictionary(all, pause != 0);
-}
-
-}  // extern "C"
+}  // namespace tplex

@@ -8,9 +8,10 @@
 #include <emmintrin.h>
 #endif
 
+#include "base/compiler.h"
+#include "base/text.h"
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/compiler.h"
-#include "lex/lexer.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
 #include "scan/pass_facts.h"
@@ -20,28 +21,24 @@ namespace tplex {
 
 namespace {
 
-// Character classes. Codes from 128 up are in none of the first four.
+// Character classes. Codes from 128 up are in none of them.
 enum : std::uint8_t {
     cc_letter = 1,  // A-Z a-z
     cc_digit = 2,   // 0-9
-    cc_hex = 4,     // 0-9 A-F a-f
-    cc_ident = 8,   // letter, digit, underscore
+    cc_ident = 4,   // letter, digit, underscore
 };
 
 constexpr std::array<std::uint8_t, 256> make_classes() {
     std::array<std::uint8_t, 256> t{};
     for (int c = 'A'; c <= 'Z'; ++c) t[c] = cc_letter | cc_ident;
     for (int c = 'a'; c <= 'z'; ++c) t[c] = cc_letter | cc_ident;
-    for (int c = '0'; c <= '9'; ++c) t[c] = cc_digit | cc_hex | cc_ident;
-    for (int c = 'A'; c <= 'F'; ++c) t[c] |= cc_hex;
-    for (int c = 'a'; c <= 'f'; ++c) t[c] |= cc_hex;
+    for (int c = '0'; c <= '9'; ++c) t[c] = cc_digit | cc_ident;
     t['_'] = cc_ident;
     return t;
 }
 constexpr std::array<std::uint8_t, 256> classes = make_classes();
 static_assert(classes['_'] == cc_ident && classes[0] == 0 && classes[255] == 0);
-static_assert(classes['f'] == (cc_letter | cc_hex | cc_ident) &&
-              classes['g'] == (cc_letter | cc_ident));
+static_assert(classes['f'] == (cc_letter | cc_ident) && classes['7'] == (cc_digit | cc_ident));
 
 constexpr std::array<char, 256> make_upper() {
     std::array<char, 256> t{};
@@ -63,9 +60,6 @@ constexpr std::array<char, 256> ident_upper = make_ident_upper();
 
 inline bool is_digit(std::uint8_t c) {
     return (classes[c] & cc_digit) != 0;
-}
-inline bool is_hex(std::uint8_t c) {
-    return (classes[c] & cc_hex) != 0;
 }
 inline bool is_ident(std::uint8_t c) {
     return (classes[c] & cc_ident) != 0;
@@ -116,7 +110,7 @@ TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     while (is_ident(*p)) ++p;  // read and dropped
 #endif
     read_cursor = p;
-    std::memset(t + n, 0, 16);
+    std::memset(t + n, 0, read_slack);
     return n;
 }
 
@@ -128,18 +122,6 @@ TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c) {
     if (tok.kind == tk_macro) return push_macro(tok.def_text1);  // 0: scan the body
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
-
-// A digit's value in bases up to 16, or no_digit.
-constexpr std::uint8_t no_digit = 0xFF;
-constexpr std::array<std::uint8_t, 256> make_digit_values() {
-    std::array<std::uint8_t, 256> t{};
-    for (auto &v : t) v = no_digit;
-    for (int c = '0'; c <= '9'; ++c) t[c] = static_cast<std::uint8_t>(c - '0');
-    for (int c = 'A'; c <= 'F'; ++c) t[c] = t[c + 32] = static_cast<std::uint8_t>(c - 55);
-    return t;
-}
-constexpr std::array<std::uint8_t, 256> digit_values = make_digit_values();
-static_assert(digit_values['f'] == 15 && digit_values['g'] == no_digit && digit_values['9'] == 9);
 
 // A number, its first character c already taken.
 status_code scan_number(std::uint8_t c, bool negative) {
@@ -512,19 +494,18 @@ TPLEX_HOT_INLINE status_code scan() {
 
 }  // namespace
 
-bool is_ident_char(std::uint8_t c) {
-    return is_ident(c);
+std::uint8_t push_back_flag = 0;
+
+void scanner_reset() {
+    push_back_flag = 0;
+}
+
+void back_token() {
+    push_back_flag = 1;
 }
 
 status_code add_digit(std::uint32_t *number, std::uint8_t c, std::uint8_t base) {
-    std::uint32_t d;
-    if (is_digit(c)) {
-        d = c - '0';
-    } else {
-        const auto u = static_cast<std::uint8_t>(upper[c]);
-        if (!is_hex(u)) return TPLEX_BAD_DIGIT;
-        d = u - 55u;
-    }
+    const std::uint8_t d = digit_values[c];  // no_digit is no digit of any base
     if (d >= base) return TPLEX_BAD_DIGIT;
     *number = *number * base + d;
     return 0;

@@ -9,40 +9,19 @@
 // with memchr as well, once per block and once after each carriage return,
 // so every byte is looked at a small constant number of times. The slots
 // live in static storage: opening a file allocates nothing.
+#include "source/platform_posix.h"
+
 #include <sys/stat.h>
 
 #include <cstring>
 
-#include "lex/limits.h"
-#include "source/platform.h"
+#include "base/limits.h"
 
 namespace tplex::platform {
 
-namespace {
-
-constexpr std::size_t read_block_size = std::size_t{32} * 1024;
-// 19 files can be open on the source stack at once; the rest is headroom
-// for callers that open streams of their own through this layer.
-constexpr int stream_slot_count = 24;
-constexpr unsigned char end_mark = 0x1A;  // ends a file read in text mode
-
-struct stream_state {
-    std::FILE *file;      // null while the slot is free
-    std::size_t pos;      // next byte of block to deliver
-    std::size_t end;      // bytes of block that may be delivered
-    std::size_t next_cr;  // first CR at or after pos, or end when there is none
-    bool at_end;          // the file has nothing more to give: end, read error or 0x1A
-    unsigned char block[read_block_size];
-};
-
-// The read state of every open stream, and the slot used last (a file is
-// read line after line, so it is nearly always the one asked for next).
-struct stream_table {
-    stream_state slots[stream_slot_count];
-    int last_used;
-};
-
 stream_table streams;
+
+namespace {
 
 stream_state *find_slot(std::FILE *file) {
     if (streams.slots[streams.last_used].file == file) return &streams.slots[streams.last_used];

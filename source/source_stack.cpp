@@ -6,9 +6,8 @@
 #include <cstddef>
 #include <cstring>
 
-#include "lex/lexer.h"
-#include "lex/text.h"
-#include "scan/char_source.h"
+#include "base/memory.h"
+#include "base/text.h"
 #include "source/platform.h"
 
 namespace tplex {
@@ -20,7 +19,9 @@ int32_t include_dir_count = 0;
 
 namespace {
 
-inline constexpr std::uint32_t no_line_yet = 0xFFFFFFFFu;
+// The scanner reads up to read_slack bytes past a line's NUL: the last
+// frame's line is followed by its file handle and that slack.
+constexpr std::size_t source_stack_bytes = sizeof(source_frame) * source_frame_count + read_slack;
 
 // Length of text when it has at most limit characters, else limit + 1;
 // reads no further than that.
@@ -75,6 +76,29 @@ status_code open_from_include_dirs(const char *name) {
 
 }  // namespace
 
+status_code source_stack_create() {
+    source_stack = static_cast<source_frame *>(mem_alloc(source_stack_bytes));
+    if (source_stack == nullptr) return TPLEX_MALLOC_FAILED;
+    std::memset(source_stack, 0, source_stack_bytes);
+    // Frame 0 never holds a file, yet a diagnostic at depth 0 prints its
+    // position: with no line yet it prints as line 0.
+    for (int d = 0; d < source_frame_count; ++d) source_stack[d].line_no = no_line_yet;
+    return 0;
+}
+
+// Files left open when the frames go would be unreachable: they are closed.
+void source_stack_destroy() {
+    close_source_files();
+    mem_free(source_stack);
+    source_stack = nullptr;
+    source_depth = 0;
+}
+
+void source_stack_reset() {
+    source_depth = 0;
+    include_dir_count = 0;
+}
+
 // On a POSIX host a name that begins with "/" is absolute as well.
 bool is_absolute_path(const char *name) {
     if (name == nullptr) return false;
@@ -92,10 +116,9 @@ bool is_absolute_path(const char *name) {
 // A failed open leaves the frame it would have used as a frame without a
 // file (position 0, no line yet, no stream), where the parser can see it;
 // the depth and the file below are unchanged.
-status_code open_source_file(const char *name) {
+status_code push_source_file(const char *name) {
     if (source_stack == nullptr) return TPLEX_NOT_INITIALISED;
     if (name == nullptr) return TPLEX_NULL_FILENAME;
-    char_source_sync();
     // A negative depth (only a caller writing through the handed-out
     // address can make one) is refused like a full stack rather than
     // followed outside the block.
@@ -118,9 +141,8 @@ status_code open_source_file(const char *name) {
 }
 
 // Before the stack exists there is nothing open to close: 0.
-status_code close_sources() {
+status_code close_source_files() {
     if (source_stack == nullptr) return TPLEX_OK;
-    char_source_sync();
     status_code result = TPLEX_OK;
     for (int i = max_source_depth; i >= 1; --i) {
         source_frame &frame = source_stack[i];
@@ -129,18 +151,6 @@ status_code close_sources() {
         frame.file = nullptr;
     }
     return result;
-}
-
-// The main file is reopened under the path it was opened with, which, with
-// the include directories gone, reaches the same file.
-status_code rewind_input() {
-    if (source_stack == nullptr) return TPLEX_NOT_INITIALISED;
-    lex_reset();
-    char main_path[path_size];
-    std::memcpy(main_path, source_stack[1].path, sizeof main_path);
-    main_path[path_size - 1] = '\0';
-    close_sources();
-    return open_source_file(main_path);
 }
 
 // A null directory, or one too long for an entry (254 characters), is
@@ -153,6 +163,15 @@ status_code add_include_dir(const char *dir) {
     std::memcpy(include_dirs[include_dir_count], dir, len + 1);
     ++include_dir_count;
     return TPLEX_OK;
+}
+
+source_frame *pop_source_file() {
+    source_frame &f = source_stack[source_depth];
+    if (f.file != nullptr) platform::close_source(f.file);
+    f.file = nullptr;
+    --source_depth;
+    if (source_depth < 1 || source_depth > max_source_depth) return nullptr;
+    return &source_stack[source_depth];
 }
 
 }  // namespace tplex

@@ -5,14 +5,14 @@
 #include <cstdarg>
 #include <cstring>
 
-#include "lex/memory.h"
+#include "base/memory.h"
 
 namespace tplex {
 
-OutputStream output_stream{};
+output_stream_state output_stream{};
 
 void set_output_switches(std::uint32_t flags) {
-    OutputStream &s = output_stream;
+    output_stream_state &s = output_stream;
     s.align = (flags & TPLEX_OUT_ALIGN) != 0;
     s.hex_text = (flags & TPLEX_OUT_HEX_TEXT) != 0;
     s.drop_newlines = (flags & TPLEX_OUT_DROP_NEWLINES) != 0;
@@ -55,17 +55,17 @@ status_code fill_to(std::uint32_t boundary, std::uint8_t fill) {
     return TPLEX_OK;
 }
 
-ByteChunk *new_chunk() {
-    auto *chunk = static_cast<ByteChunk *>(mem_alloc(sizeof(ByteChunk)));
+byte_chunk *new_chunk() {
+    auto *chunk = static_cast<byte_chunk *>(mem_alloc(sizeof(byte_chunk)));
     if (chunk == nullptr) return nullptr;
     chunk->link = nullptr;
     chunk->used = 0;
     return chunk;
 }
 
-void release_chunks(ByteChunk *first) {
+void release_chunks(byte_chunk *first) {
     while (first != nullptr) {
-        ByteChunk *next = first->link;
+        byte_chunk *next = first->link;
         mem_free(first);
         first = next;
     }
@@ -78,7 +78,7 @@ namespace {
 // has a fixed length and the header can be rewritten in place. Text write
 // failures are detected like raw ones, so a full disk never passes silently.
 status_code put_file_byte(std::uint8_t b) {
-    OutputStream &s = output_stream;
+    output_stream_state &s = output_stream;
     if (s.file == nullptr) return TPLEX_OUT_WRITE_FAILED;  // reported when it closed
     if (!s.hex_text) {
         if (std::fputc(b, s.file) == EOF) return fail_write();
@@ -95,10 +95,10 @@ status_code put_file_byte(std::uint8_t b) {
 // The memory sink: appends, starting a new chunk when the current one is
 // full. A failed allocation loses the byte and leaves the offset.
 status_code put_memory_byte(std::uint8_t b) {
-    OutputStream &s = output_stream;
-    ByteChunk *chunk = s.memory_current;
+    output_stream_state &s = output_stream;
+    byte_chunk *chunk = s.memory_current;
     if (chunk->used == chunk_size) {
-        ByteChunk *next = new_chunk();
+        byte_chunk *next = new_chunk();
         if (next == nullptr) return TPLEX_OUT_NO_MEMORY_CHUNK;
         chunk->link = next;
         s.memory_current = chunk = next;
@@ -185,7 +185,7 @@ status_code EndBlock(void) {
 status_code StartMemoryOutput(void) {
     if (output_stream.file != nullptr) return TPLEX_OUT_CANNOT_OPEN;
     // Allocate before releasing, so a failure keeps the earlier image.
-    tplex::ByteChunk *first = tplex::new_chunk();
+    tplex::byte_chunk *first = tplex::new_chunk();
     if (first == nullptr) return TPLEX_OUT_NO_MEMORY_CHUNK;
     tplex::release_chunks(output_stream.memory_first);
     output_stream.memory_first = output_stream.memory_current = first;
@@ -207,7 +207,7 @@ uint32_t MemoryOutputSize(void) {
 
 uint32_t CopyMemoryOutput(uint8_t *buffer, uint32_t size) {
     uint32_t copied = 0;
-    for (const tplex::ByteChunk *chunk = output_stream.memory_first;
+    for (const tplex::byte_chunk *chunk = output_stream.memory_first;
          chunk != nullptr && copied < size; chunk = chunk->link) {
         uint32_t part = chunk->used < size - copied ? chunk->used : size - copied;
         std::memcpy(buffer + copied, chunk->data, part);

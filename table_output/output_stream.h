@@ -7,24 +7,24 @@
 #include <cstdint>
 #include <cstdio>
 
-#include "lex/compiler.h"
+#include "base/compiler.h"
 #include "tplex/table_output.h"
 
 namespace tplex {
 
-inline constexpr std::uint32_t chunk_size = 10000;  // data bytes of a ByteChunk
+inline constexpr std::uint32_t chunk_size = 10000;  // data bytes of a byte_chunk
 inline constexpr std::uint32_t block_stack_size = 100;
 inline constexpr std::uint8_t fill_byte = 0x3C;  // alignment and block fill
 
 // A link of the string store or of memory output. Chunks are appended,
 // never moved or reallocated.
-struct ByteChunk {
-    ByteChunk *link;  // next chunk, null in the last one
+struct byte_chunk {
+    byte_chunk *link;  // next chunk, null in the last one
     std::uint32_t used;
     std::uint8_t data[chunk_size];
 };
 
-struct OutputStream {
+struct output_stream_state {
     // The table file; null when none is open or a failure has closed it, so
     // nothing can reach a closed file.
     std::FILE *file;
@@ -39,15 +39,15 @@ struct OutputStream {
     bool literal_backslash;
     // Memory output: on, its chain and its total.
     bool memory;
-    ByteChunk *memory_first;
-    ByteChunk *memory_current;
+    byte_chunk *memory_first;
+    byte_chunk *memory_current;
     std::uint32_t memory_total;
     // Starting offsets of the open blocks.
     std::uint32_t block_start[block_stack_size];
     std::uint32_t block_depth;
 };
 
-extern OutputStream output_stream;
+extern output_stream_state output_stream;
 
 // Sets the five switches of OpenOutput's flags word.
 void set_output_switches(std::uint32_t flags);
@@ -62,9 +62,9 @@ status_code fail_write();
 // Writes fill bytes until the offset is a multiple of boundary.
 status_code fill_to(std::uint32_t boundary, std::uint8_t fill = fill_byte);
 // A new empty chunk from mem_alloc, or null.
-ByteChunk *new_chunk();
+byte_chunk *new_chunk();
 // Releases a chain of chunks from its first.
-void release_chunks(ByteChunk *first);
+void release_chunks(byte_chunk *first);
 
 }  // namespace tplex
 

@@ -5,16 +5,16 @@
 #include <cstdio>
 #include <cstring>
 
-#include "lex/memory.h"
+#include "base/memory.h"
 
 namespace tplex {
 
-TableOutput table_output{};
+table_output_state table_output{};
 
 namespace {
 
-OutputStream &stream = output_stream;
-TableOutput &table = table_output;
+output_stream_state &stream = output_stream;
+table_output_state &table = table_output;
 
 // The failure of most operations: close the file, tell, return the code.
 status_code fail(status_code code, const char *message) {
@@ -31,8 +31,8 @@ status_code fail_id(status_code code, const char *format, std::uint32_t shown) {
 
 void release_uses() {
     for (std::uint32_t i = 0; i < table.id_count; ++i) {
-        for (RelocRecord *use = table.relocatables[i].first_use; use != nullptr;) {
-            RelocRecord *next = use->next;
+        for (reloc_record *use = table.relocatables[i].first_use; use != nullptr;) {
+            reloc_record *next = use->next;
             mem_free(use);
             use = next;
         }
@@ -41,7 +41,7 @@ void release_uses() {
 
 // Leaves the store with one empty chunk, allocating it when there is none.
 bool prepare_store() {
-    StringStore &store = table.store;
+    string_store &store = table.store;
     if (store.first == nullptr) {
         store.first = new_chunk();
         if (store.first == nullptr) return false;
@@ -59,12 +59,12 @@ bool prepare_store() {
 bool prepare_relocatables() {
     if (table.relocatables == nullptr) {
         table.relocatables =
-            static_cast<Relocatable *>(mem_alloc(sizeof(Relocatable) * max_references));
+            static_cast<relocatable *>(mem_alloc(sizeof(relocatable) * max_references));
         if (table.relocatables == nullptr) return false;
     } else {
         release_uses();
     }
-    std::memset(table.relocatables, 0, sizeof(Relocatable) * max_references);
+    std::memset(table.relocatables, 0, sizeof(relocatable) * max_references);
     table.id_count = 0;
     return true;
 }
@@ -112,7 +112,7 @@ std::uint32_t copy_escaped(std::uint8_t *dest, const char *text) {
 // The string table: every chunk's used bytes, until the total is reached.
 status_code write_strings() {
     std::uint32_t written = 0;
-    for (const ByteChunk *chunk = table.store.first; written < table.store.total;
+    for (const byte_chunk *chunk = table.store.first; written < table.store.total;
          chunk = chunk->link) {
         if (chunk == nullptr) {
             return fail(TPLEX_OUT_STRING_TABLE_DAMAGED,
@@ -130,22 +130,22 @@ status_code write_strings() {
 // The relocation entries, id by id and use by use, each checked on the way.
 status_code write_relocations(std::uint32_t s, std::uint32_t r) {
     for (std::uint32_t id = 1; id <= table.id_count; ++id) {
-        const Relocatable &entry = table.relocatables[id - 1];
+        const relocatable &entry = table.relocatables[id - 1];
         if (entry.first_use == nullptr) {
             return fail_id(TPLEX_OUT_UNUSED_REFERENCE,
-                           "sg_TableOutput: Relocatable with no references %d\n", id - 1);
+                           "sg_TableOutput: relocatable with no references %d\n", id - 1);
         }
         if (entry.target == 0) {
             return fail(TPLEX_OUT_UNDEFINED_REFERENCE,
-                        "sg_TableOutput: Relocatable with no definition\n");
+                        "sg_TableOutput: relocatable with no definition\n");
         }
         // Computed wide: a string position far beyond the table must not wrap
         // around to an offset below R.
         std::uint64_t target =
             entry.string_flag != 0 ? std::uint64_t{s} + entry.target - 1 : entry.target;
-        for (const RelocRecord *use = entry.first_use; use != nullptr; use = use->next) {
+        for (const reloc_record *use = entry.first_use; use != nullptr; use = use->next) {
             if (use->offset >= r || target >= r) {
-                return fail(TPLEX_OUT_OUT_OF_RANGE, "sg_TableOutput: Relocatable out of range\n");
+                return fail(TPLEX_OUT_OUT_OF_RANGE, "sg_TableOutput: relocatable out of range\n");
             }
             status_code status = WriteUInt32(use->offset);
             if (status == TPLEX_OK) status = WriteUInt32(static_cast<std::uint32_t>(target));
@@ -218,7 +218,7 @@ status_code OpenOutput(const char *name, uint32_t flags, uint32_t tag) {
     // The file exists before the tables: after these failures it stays, empty.
     if (!tplex::prepare_store()) {
         return tplex::fail(TPLEX_OUT_NO_MEMORY_TABLES,
-                           "sg_TableOutput: Failed to malloc StringStore\n");
+                           "sg_TableOutput: Failed to malloc string_store\n");
     }
     if (!tplex::prepare_relocatables()) {
         return tplex::fail(TPLEX_OUT_NO_MEMORY_TABLES,
@@ -248,14 +248,14 @@ status_code CreateReference(uint32_t id, uint32_t offset) {
         return tplex::fail_id(TPLEX_OUT_BAD_USE_ID,
                               "sg_TableOutput: Illegal cross reference id %d\n", id);
     }
-    auto *use = static_cast<tplex::RelocRecord *>(tplex::mem_alloc(sizeof(tplex::RelocRecord)));
+    auto *use = static_cast<tplex::reloc_record *>(tplex::mem_alloc(sizeof(tplex::reloc_record)));
     if (use == nullptr) {
         return tplex::fail(TPLEX_OUT_NO_MEMORY_RELOC,
                            "sg_TableOutput (CreateReference): Failed to malloc reloc record\n");
     }
     use->next = nullptr;
     use->offset = offset;
-    tplex::Relocatable &entry = table_output.relocatables[id - 1];
+    tplex::relocatable &entry = table_output.relocatables[id - 1];
     if (entry.first_use == nullptr) {
         entry.first_use = use;
     } else {
@@ -270,7 +270,7 @@ status_code SetReferenceTarget(uint32_t id, uint32_t target, uint32_t string_fla
         return tplex::fail_id(TPLEX_OUT_BAD_TARGET_ID,
                               "sg_TableOutput: Illegal cross reference id %d\n", id);
     }
-    tplex::Relocatable &entry = table_output.relocatables[id - 1];
+    tplex::relocatable &entry = table_output.relocatables[id - 1];
     if (entry.target != 0) {
         return tplex::fail_id(TPLEX_OUT_DOUBLE_DEFINITION,
                               "sg_TableOutput: Double definition of reference %d\n", id - 1);
@@ -324,13 +324,13 @@ status_code AddToStringStore(uint32_t *out_position, const char *text) {
     tplex::set_out(out_position, 0);
     if (text == nullptr) text = "";
     if (tplex::too_long(text)) return TPLEX_OUT_STRING_TOO_LONG;
-    tplex::StringStore &store = table_output.store;
+    tplex::string_store &store = table_output.store;
     uint32_t needed = static_cast<uint32_t>(std::strlen(text)) + 1;
     if (store.current == nullptr || needed > tplex::chunk_size - store.current->used) {
-        tplex::ByteChunk *chunk = tplex::new_chunk();
+        tplex::byte_chunk *chunk = tplex::new_chunk();
         if (chunk == nullptr) {
             return tplex::fail(TPLEX_OUT_NO_MEMORY_CHUNK,
-                               "sg_TableOutput (StoreString): Failed to malloc StringStore\n");
+                               "sg_TableOutput (StoreString): Failed to malloc string_store\n");
         }
         if (store.current == nullptr) {
             store.first = chunk;
@@ -378,7 +378,7 @@ status_code FreeOutputTables(void) {
     // reach the freed tables: with no table no id is handed out, and a
     // string gets a new first chunk.
     tplex::release_chunks(table_output.store.first);
-    table_output.store = tplex::StringStore{};
+    table_output.store = tplex::string_store{};
     if (table_output.relocatables != nullptr) {
         tplex::release_uses();
         tplex::mem_free(table_output.relocatables);

@@ -17,29 +17,29 @@ inline constexpr std::uint32_t plain_placeholder = 0xA5A5A5A5u;
 inline constexpr std::uint32_t string_placeholder = 0x4B4B4B4Bu;
 
 // One use of a reference: where its placeholder begins.
-struct RelocRecord {
-    RelocRecord *next;
+struct reloc_record {
+    reloc_record *next;
     std::uint32_t offset;
 };
 
 // One reference id (id n is entry n - 1).
-struct Relocatable {
-    RelocRecord *first_use;  // uses in creation order
-    RelocRecord *last_use;   // so a use is appended without walking the chain
-    std::uint32_t target;    // 0: not defined; an offset, or a 1-based string position
+struct relocatable {
+    reloc_record *first_use;  // uses in creation order
+    reloc_record *last_use;   // so a use is appended without walking the chain
+    std::uint32_t target;     // 0: not defined; an offset, or a 1-based string position
     std::uint32_t string_flag;
 };
 
-struct StringStore {
-    ByteChunk *first;     // null before the first OpenOutput and after FreeOutputTables
-    ByteChunk *current;   // strings are appended here
+struct string_store {
+    byte_chunk *first;    // null before the first OpenOutput and after FreeOutputTables
+    byte_chunk *current;  // strings are appended here
     std::uint32_t total;  // bytes of all stored strings, terminators included
 };
 
-struct TableOutput {
-    Relocatable *relocatables;  // max_references entries, or null
+struct table_output_state {
+    relocatable *relocatables;  // max_references entries, or null
     std::uint32_t id_count;     // ids handed out: 1 to id_count are valid
-    StringStore store;
+    string_store store;
     // An output is open from a successful OpenOutput until CloseOutput
     // succeeds or AbandonOutput; a failure that closes the file leaves it
     // open, so AbandonOutput can still delete the partial file.
@@ -48,7 +48,7 @@ struct TableOutput {
     char name[output_name_size];  // for AbandonOutput
 };
 
-extern TableOutput table_output;
+extern table_output_state table_output;
 
 }  // namespace tplex
 

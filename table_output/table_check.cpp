@@ -1,12 +1,15 @@
-// The table file inspector. Every read is checked against the size first.
-#include "table_output/table_check.h"
-
+// The table file checker of tplex/table_output.h. Every read is checked
+// against the size first; the findings are data, and printing them is left
+// to the caller.
 #include <cstdarg>
+#include <cstdio>
 #include <cstring>
 
-#include "lex/compiler.h"
-#include "lex/memory.h"
+#include "base/compiler.h"
+#include "base/memory.h"
+#include "base/text.h"
 #include "table_output/references.h"
+#include "tplex/table_output.h"
 
 namespace tplex {
 
@@ -19,9 +22,9 @@ std::uint32_t word_at(const std::uint8_t *p) {
            std::uint32_t{p[3]} << 24;
 }
 
-bool failed(TableCheck &check, const char *format, ...) TPLEX_PRINTF_FORMAT(2, 3);
+bool failed(table_check &check, const char *format, ...) TPLEX_PRINTF_FORMAT(2, 3);
 
-bool failed(TableCheck &check, const char *format, ...) {
+bool failed(table_check &check, const char *format, ...) {
     va_list args;
     va_start(args, format);
     std::vsnprintf(check.error, sizeof check.error, format, args);
@@ -30,10 +33,7 @@ bool failed(TableCheck &check, const char *format, ...) {
 }
 
 int hex_digit(std::uint8_t c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
-    return -1;
+    return digit_values[c] < 16 ? digit_values[c] : -1;
 }
 
 // Decodes hex text: " 0xHH" items, each after the first preceded by ",",
@@ -75,7 +75,7 @@ bool decode_hex(const std::uint8_t *text, std::size_t size, std::uint8_t *out, s
 
 // The header's three rules: fixed word, length equal to the size, and a
 // relocation table that starts aligned and holds whole entries.
-bool check_header(TableCheck &c) {
+bool check_header(table_check &c) {
     if (c.size < header_size) {
         return failed(c, "truncated: %u bytes, the header alone needs 16", c.size);
     }
@@ -101,11 +101,11 @@ bool check_header(TableCheck &c) {
 }
 
 // Every entry: a placeholder wholly inside body or strings, a target below R.
-bool check_relocations(TableCheck &c) {
+bool check_relocations(table_check &c) {
     std::uint32_t r = c.relocation_offset;
     c.string_offset = r;
     for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
-        TableRelocation entry = table_relocation(c, i);
+        table_relocation entry = TableRelocationAt(&c, i);
         if (entry.location < header_size || entry.location > r - 4) {
             return failed(c, "relocation %u: location %u lies outside offsets 16 to %u", i,
                           entry.location, r - 4);
@@ -129,7 +129,7 @@ bool check_relocations(TableCheck &c) {
 // String targets: each starts a string that ends before R. The first
 // referenced string need not start the string table (AddToStringStore can
 // store strings that nothing refers to), so its offset need not be aligned.
-bool check_strings(TableCheck &c) {
+bool check_strings(table_check &c) {
     if (c.string_count == 0) return true;
     std::uint32_t s = c.string_offset;
     std::uint32_t r = c.relocation_offset;
@@ -137,7 +137,7 @@ bool check_strings(TableCheck &c) {
         return failed(c, "string table offset %u lies in the header", s);
     }
     for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
-        TableRelocation entry = table_relocation(c, i);
+        table_relocation entry = TableRelocationAt(&c, i);
         if (!entry.is_string) continue;
         if (entry.target != s && c.table[entry.target - 1] != 0) {
             return failed(c, "relocation %u: target %u is not the start of a string", i,
@@ -151,127 +151,67 @@ bool check_strings(TableCheck &c) {
     return true;
 }
 
-void print_quoted(const char *text, std::FILE *out) {
-    std::fputc('"', out);
-    for (const char *p = text; *p != '\0'; ++p) {
-        auto c = static_cast<unsigned char>(*p);
-        if (c == '"' || c == '\\') {
-            std::fprintf(out, "\\%c", c);
-        } else if (c == '\n') {
-            std::fputs("\\n", out);
-        } else if (c < 0x20 || c >= 0x7F) {
-            std::fprintf(out, "\\x%02x", c);
-        } else {
-            std::fputc(c, out);
-        }
-    }
-    std::fputc('"', out);
-}
-
 }  // namespace
 
-bool check_table(const std::uint8_t *data, std::size_t size, TableCheck &result) {
-    result = TableCheck{};
-    if (size > 0xFFFFFFFFu) return failed(result, "larger than any table (%zu bytes)", size);
-    result.table = data;
-    result.size = static_cast<std::uint32_t>(size);
+}  // namespace tplex
+
+using tplex::check_header;
+using tplex::check_relocations;
+using tplex::check_strings;
+
+extern "C" {
+
+uint8_t CheckTable(const uint8_t *data, size_t size, table_check *result) {
+    *result = table_check{};
+    if (size > 0xFFFFFFFFu)
+        return tplex::failed(*result, "larger than any table (%zu bytes)", size);
+    result->table = data;
+    result->size = static_cast<uint32_t>(size);
     // Hex text begins " 0x". A raw table whose tag happens to begin with
     // those bytes fails to decode and is then read as raw.
     if (size >= 3 && std::memcmp(data, " 0x", 3) == 0) {
-        result.decoded = static_cast<std::uint8_t *>(mem_alloc(size / 5 + 1));
-        if (result.decoded == nullptr) return failed(result, "out of memory");
-        std::uint32_t count = 0;
-        std::size_t fault = 0;
-        if (decode_hex(data, size, result.decoded, count, fault)) {
-            result.table = result.decoded;
-            result.size = count;
-            result.hex_text = true;
+        result->decoded = static_cast<uint8_t *>(tplex::mem_alloc(size / 5 + 1));
+        if (result->decoded == nullptr) return tplex::failed(*result, "out of memory");
+        uint32_t count = 0;
+        size_t fault = 0;
+        if (tplex::decode_hex(data, size, result->decoded, count, fault)) {
+            result->table = result->decoded;
+            result->size = count;
+            result->hex_text = 1;
         } else {
-            TableCheck raw{};
+            table_check raw{};
             raw.table = data;
-            raw.size = result.size;
+            raw.size = result->size;
             if (check_header(raw) && check_relocations(raw) && check_strings(raw)) {
-                release_table_check(result);
-                result = raw;
-                return true;
+                ReleaseTableCheck(result);
+                *result = raw;
+                return 1;
             }
-            return failed(result, "malformed hex text at character %zu", fault);
+            return tplex::failed(*result, "malformed hex text at character %zu", fault);
         }
     }
-    return check_header(result) && check_relocations(result) && check_strings(result);
+    return check_header(*result) && check_relocations(*result) && check_strings(*result);
 }
 
-void release_table_check(TableCheck &result) {
-    mem_free(result.decoded);
-    result.decoded = nullptr;
-    result.table = nullptr;
-    result.size = 0;
+void ReleaseTableCheck(table_check *result) {
+    tplex::mem_free(result->decoded);
+    result->decoded = nullptr;
+    result->table = nullptr;
+    result->size = 0;
 }
 
-TableRelocation table_relocation(const TableCheck &check, std::uint32_t index) {
-    const std::uint8_t *entry = check.table + check.relocation_offset + std::size_t{8} * index;
-    TableRelocation result{word_at(entry), word_at(entry + 4), false};
-    if (result.location <= check.relocation_offset - 4 && result.location >= header_size) {
-        result.is_string = word_at(check.table + result.location) == string_placeholder;
+table_relocation TableRelocationAt(const table_check *check, uint32_t index) {
+    const uint8_t *entry = check->table + check->relocation_offset + size_t{8} * index;
+    table_relocation result{tplex::word_at(entry), tplex::word_at(entry + 4), 0};
+    if (result.location <= check->relocation_offset - 4 && result.location >= tplex::header_size) {
+        result.is_string =
+            tplex::word_at(check->table + result.location) == tplex::string_placeholder;
     }
     return result;
 }
 
-const char *table_string(const TableCheck &check, std::uint32_t offset) {
-    return reinterpret_cast<const char *>(check.table + offset);
+const char *TableStringAt(const table_check *check, uint32_t offset) {
+    return reinterpret_cast<const char *>(check->table + offset);
 }
 
-void print_table_summary(const TableCheck &c, std::FILE *out) {
-    std::uint32_t body_end = c.string_offset;
-    std::fprintf(out, "form: %s, %u bytes\n", c.hex_text ? "hex text" : "raw", c.size);
-    std::fprintf(out, "header: tag %u, length %u, relocations at %u, word %u\n", c.tag, c.length,
-                 c.relocation_offset, c.header_word);
-    std::fprintf(out, "body: %u bytes at offsets 16 to %u\n", body_end - header_size, body_end);
-    std::fprintf(out, "strings: %u, string table at %u\n", c.string_count, c.string_offset);
-    for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
-        TableRelocation entry = table_relocation(c, i);
-        if (!entry.is_string) continue;
-        std::fprintf(out, "  %u: ", entry.target);
-        print_quoted(table_string(c, entry.target), out);
-        std::fputc('\n', out);
-    }
-    std::fprintf(out, "relocations: %u\n", c.relocation_count);
-    for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
-        TableRelocation entry = table_relocation(c, i);
-        std::fprintf(out, "  %u -> %u%s\n", entry.location, entry.target,
-                     entry.is_string ? " (string)" : "");
-    }
-}
-
-int inspect_table_file(const char *path, std::FILE *out, std::FILE *err) {
-    std::FILE *file = std::fopen(path, "rb");
-    if (file == nullptr) {
-        std::fprintf(err, "tplex table: cannot open '%s'\n", path);
-        return 1;
-    }
-    long size = -1;
-    if (std::fseek(file, 0, SEEK_END) == 0) size = std::ftell(file);
-    std::uint8_t *data = nullptr;
-    bool read = size >= 0 && std::fseek(file, 0, SEEK_SET) == 0 &&
-                (data = static_cast<std::uint8_t *>(mem_alloc(size > 0 ? size : 1))) != nullptr &&
-                std::fread(data, 1, size, file) == static_cast<std::size_t>(size);
-    std::fclose(file);
-    if (!read) {
-        mem_free(data);
-        std::fprintf(err, "tplex table: cannot read '%s'\n", path);
-        return 1;
-    }
-    TableCheck check{};
-    bool sound = check_table(data, static_cast<std::size_t>(size), check);
-    if (sound) {
-        std::fprintf(out, "file: %s\n", path);
-        print_table_summary(check, out);
-    } else {
-        std::fprintf(err, "tplex table: %s: %s\n", path, check.error);
-    }
-    release_table_check(check);
-    mem_free(data);
-    return sound ? 0 : 1;
-}
-
-}  // namespace tplex
+}  // extern "C"

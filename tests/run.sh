@@ -130,17 +130,21 @@ windows_build_and_test() {
     echo "== Windows checks that could not run: $skipped"
 }
 
-# Every C and C++ source as .clang-format lays it out; the library and the
-# tool clean under .clang-tidy's checks.
+# The library's folders include one way only (tests/layers.sh); every C and
+# C++ source as .clang-format lays it out; the library and the tool clean
+# under .clang-tidy's checks.
 lint() {
     need_packages clang-format clang-tidy
     echo "== lint"
-    local sources=(lex dict scan source errors table_output tools tests fuzz include bench)
+    bash "$root/tests/layers.sh" "$root"
+    local layers  # the library's folders, as CMakeLists.txt lists them
+    read -r -a layers <<<"$(sed -n 's/^set(TPLEX_LAYERS \(.*\))$/\1/p' "$root/CMakeLists.txt")"
+    local sources=("${layers[@]}" tools tests fuzz include bench)
     (cd "$root" && find "${sources[@]}" -path bench/build -prune -o \
         \( -name '*.c' -o -name '*.cpp' -o -name '*.h' \) -print | xargs clang-format --dry-run -Werror)
     local dir="$root/build-tests/lint"
     cmake -S "$root" -B "$dir" -DCMAKE_EXPORT_COMPILE_COMMANDS=ON -DTPLEX_BUILD_TESTS=OFF >/dev/null
-    (cd "$root" && find lex dict scan source errors table_output tools -name '*.cpp' \
+    (cd "$root" && find "${layers[@]}" tools -name '*.cpp' \
         ! -name platform_windows.cpp | xargs clang-tidy -p "$dir" --quiet)
 }
 

@@ -1,54 +1,13 @@
-#include "tools/report.h"
+#include "report.h"
 
 #include <cstdio>
 #include <cstring>
 
-#ifdef _WIN32
-#include <io.h>
-#define tool_dup _dup
-#define tool_dup2 _dup2
-#define tool_close _close
-#define tool_fileno _fileno
-#else
-#include <unistd.h>
-#define tool_dup dup
-#define tool_dup2 dup2
-#define tool_close close
-#define tool_fileno fileno
-#endif
+#include "tplex/services.h"
 
 namespace tplex::tool {
 
 namespace {
-
-// Everything fn(code) writes to standard output, or false when standard
-// output cannot be diverted (fn has not run then).
-bool capture_stdout(void (*fn)(status_code), status_code code, std::string &out) {
-    std::fflush(stdout);
-    std::FILE *tmp = std::tmpfile();
-    if (tmp == nullptr) return false;
-    const int saved = tool_dup(tool_fileno(stdout));
-    if (saved < 0 || tool_dup2(tool_fileno(tmp), tool_fileno(stdout)) < 0) {
-        if (saved >= 0) tool_close(saved);
-        std::fclose(tmp);
-        return false;
-    }
-    fn(code);
-    std::fflush(stdout);
-    tool_dup2(saved, tool_fileno(stdout));
-    tool_close(saved);
-
-    std::rewind(tmp);
-    char buffer[4096];
-    std::size_t n;
-    while ((n = std::fread(buffer, 1, sizeof buffer, tmp)) > 0) out.append(buffer, n);
-    std::fclose(tmp);
-    return true;
-}
-
-void display_error(status_code code) {
-    sg_DisplayError(code);
-}
 
 // Takes apart "\nTemplate compiler error :\nMESSAGE\nFile: PATH    Line: N\nSOURCE".
 Diagnostic parse_diagnostic(const std::string &text) {
@@ -156,15 +115,52 @@ std::string escaped(const std::string &text, const char *other, bool utf8_as_is)
 
 }  // namespace
 
-Diagnostic capture_diagnostic(status_code code) {
-    std::string text;
-    if (!capture_stdout(display_error, code, text)) {
-        sg_DisplayError(code);
-        Diagnostic d;
-        d.message = "(printed above)";
-        return d;
+Diagnostic diagnostic_of(status_code code) {
+    char text[TPLEX_DIAGNOSTIC_SIZE];
+    const std::size_t n = sg_FormatError(code, text, sizeof text);
+    return parse_diagnostic(std::string(text, n < sizeof text ? n : sizeof text - 1));
+}
+
+// Printable ASCII as it is, with " and \ escaped, a line feed as \n and
+// every other byte as \xNN.
+void print_quoted(const char *text, std::FILE *out) {
+    std::fputc('"', out);
+    for (const char *p = text; *p != '\0'; ++p) {
+        auto c = static_cast<unsigned char>(*p);
+        if (c == '"' || c == '\\') {
+            std::fprintf(out, "\\%c", c);
+        } else if (c == '\n') {
+            std::fputs("\\n", out);
+        } else if (c < 0x20 || c >= 0x7F) {
+            std::fprintf(out, "\\x%02x", c);
+        } else {
+            std::fputc(c, out);
+        }
     }
-    return parse_diagnostic(text);
+    std::fputc('"', out);
+}
+
+void print_table_summary(const table_check &c, std::FILE *out) {
+    const std::uint32_t header_size = 16;
+    std::uint32_t body_end = c.string_offset;
+    std::fprintf(out, "form: %s, %u bytes\n", c.hex_text ? "hex text" : "raw", c.size);
+    std::fprintf(out, "header: tag %u, length %u, relocations at %u, word %u\n", c.tag, c.length,
+                 c.relocation_offset, c.header_word);
+    std::fprintf(out, "body: %u bytes at offsets 16 to %u\n", body_end - header_size, body_end);
+    std::fprintf(out, "strings: %u, string table at %u\n", c.string_count, c.string_offset);
+    for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
+        table_relocation entry = TableRelocationAt(&c, i);
+        if (!entry.is_string) continue;
+        std::fprintf(out, "  %u: ", entry.target);
+        print_quoted(TableStringAt(&c, entry.target), out);
+        std::fputc('\n', out);
+    }
+    std::fprintf(out, "relocations: %u\n", c.relocation_count);
+    for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
+        table_relocation entry = TableRelocationAt(&c, i);
+        std::fprintf(out, "  %u -> %u%s\n", entry.location, entry.target,
+                     entry.is_string ? " (string)" : "");
+    }
 }
 
 std::string kind_name(std::uint16_t kind) {

@@ -1,13 +1,16 @@
-// How the tool shows what the lexer delivers: token kind names, escaped
-// texts, JSON strings, and the diagnostic of a failure as sg_DisplayError
-// prints it, taken apart into message and position.
+// How the tool shows what the library delivers: token kind names, escaped
+// texts, JSON strings, the diagnostic of a failure as sg_DisplayError
+// prints it, taken apart into message and position, and the summary of a
+// checked table file.
 #ifndef TPLEX_TOOLS_REPORT_H
 #define TPLEX_TOOLS_REPORT_H
 
 #include <cstdint>
+#include <cstdio>
 #include <string>
 
 #include "tplex/lexer.h"
+#include "tplex/table_output.h"
 
 namespace tplex::tool {
 
@@ -20,10 +23,9 @@ struct Diagnostic {
     std::string source;         // the source line it showed, without its line feed
 };
 
-// Runs sg_DisplayError(code) with standard output diverted, and takes what
-// it printed apart. When the output cannot be diverted, the diagnostic is
-// printed as it is and the result holds the message only.
-Diagnostic capture_diagnostic(status_code code);
+// The diagnostic sg_DisplayError(code) would print (sg_FormatError), taken
+// apart.
+Diagnostic diagnostic_of(status_code code);
 
 // The tool's name of a token kind ("identifier", "reserved-word", ...).
 std::string kind_name(std::uint16_t kind);
@@ -47,6 +49,9 @@ std::string display_path(std::string path);
 
 // "0xd3470207": a status code as lower-case hexadecimal.
 std::string hex_code(status_code code);
+
+// Prints the summary of a sound table: header, body, strings, relocations.
+void print_table_summary(const table_check &check, std::FILE *out);
 
 }  // namespace tplex::tool
 

@@ -26,11 +26,10 @@
 #define tool_isatty isatty
 #endif
 
-#include "source/source_stack.h"
-#include "table_output/table_check.h"
-#include "tools/report.h"
+#include "report.h"
 #include "tplex/lexer.h"
-#include "tplex/tool_queries.h"
+#include "tplex/services.h"
+#include "tplex/table_output.h"
 
 namespace tplex::tool {
 namespace {
@@ -246,7 +245,7 @@ public:
             return io_error("cannot open " + opt.file, open_failure_reason(opt.file), opened);
         main_file_ = opt.file;
         for (const std::string &dir : opt.include_dirs) {
-            const status_code added = tplex::add_include_dir(dir.c_str());
+            const status_code added = ::add_include_dir(dir.c_str());
             if (added < 0) return io_error("-I " + dir, "", added);
         }
         return -1;
@@ -263,7 +262,7 @@ public:
     // The diagnostic of a failure. Where the library shows no file (at the
     // end of input), the position and line are those of file() and line().
     Diagnostic diagnose(status_code code) const {
-        Diagnostic d = capture_diagnostic(code);
+        Diagnostic d = diagnostic_of(code);
         if (!d.has_position || d.file.empty()) {
             d.has_position = true;
             d.file = file();
@@ -279,7 +278,7 @@ private:
 
     // "tplex: WHAT: REASON (CODE: MESSAGE)", or without REASON.
     static int io_error(const std::string &what, const std::string &reason, status_code code) {
-        const Diagnostic d = capture_diagnostic(code);
+        const Diagnostic d = diagnostic_of(code);
         const std::string library = hex_code(code) + ": " + d.message;
         if (reason.empty())
             std::fprintf(stderr, "%s: %s: %s\n", program, what.c_str(), d.message.c_str());
@@ -529,15 +528,42 @@ int run_dict(const Options &opt) {
 // tplex table
 // ---------------------------------------------------------------------------
 
+// The whole of a file, or false when it cannot be read.
+bool read_file(std::FILE *file, std::vector<std::uint8_t> &data) {
+    std::uint8_t block[4096];
+    std::size_t n;
+    while ((n = std::fread(block, 1, sizeof block, file)) > 0)
+        data.insert(data.end(), block, block + n);
+    return std::ferror(file) == 0;
+}
+
 int run_table(const Options &opt) {
     // A file that cannot be opened is an I/O error (2), not a damaged table.
+    const char *path = opt.file.c_str();
     const std::string reason = open_failure_reason(opt.file);
-    if (!reason.empty()) {
-        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, opt.file.c_str(), reason.c_str());
+    std::FILE *file = reason.empty() ? std::fopen(path, "rb") : nullptr;
+    if (file == nullptr) {
+        std::fprintf(stderr, "%s: cannot open %s: %s\n", program, path,
+                     reason.empty() ? std::strerror(errno) : reason.c_str());
         return exit_usage;
     }
-    const int status = tplex::inspect_table_file(opt.file.c_str(), stdout, stderr);
-    return status == 0 ? exit_clean : exit_failures;
+    std::vector<std::uint8_t> data;
+    const bool read = read_file(file, data);
+    std::fclose(file);
+    if (!read) {
+        std::fprintf(stderr, "tplex table: cannot read '%s'\n", path);
+        return exit_failures;
+    }
+    table_check check{};
+    const bool sound = CheckTable(data.data(), data.size(), &check) != 0;
+    if (sound) {
+        std::printf("file: %s\n", path);
+        print_table_summary(check, stdout);
+    } else {
+        std::fprintf(stderr, "tplex table: %s: %s\n", path, check.error);
+    }
+    ReleaseTableCheck(&check);
+    return sound ? exit_clean : exit_failures;
 }
 
 // ---------------------------------------------------------------------------

@@ -151,6 +151,50 @@ uint32_t CopyMemoryOutput(uint8_t *buffer, uint32_t size);
 /* Switches memory output off and releases the image. Always 0. */
 status_code FreeMemoryOutput(void);
 
+/* ------------------------------------------------------------------------ */
+/* Checking a table file                                                    */
+/* ------------------------------------------------------------------------ */
+
+/* The checker reads a table file's bytes, raw or hex text, checks the
+ * framing and every relocation entry, and gives its findings as data. It
+ * never reads past the bytes it is given; a malformed table is a finding,
+ * not a crash. */
+
+/* One relocation entry of a checked table. */
+typedef struct table_relocation {
+    uint32_t location; /* offset of the placeholder */
+    uint32_t target;   /* offset it stands for */
+    uint8_t is_string; /* placeholder 0x4B4B4B4B: the target starts a string */
+} table_relocation;
+
+/* What CheckTable found. table points at the table's bytes: into the data
+ * given when it was raw, into decoded (owned) when it was hex text. */
+typedef struct table_check {
+    const uint8_t *table;
+    uint32_t size;              /* bytes of table */
+    uint8_t hex_text;           /* 1 when the file was hex text */
+    uint8_t *decoded;           /* the decoded bytes of hex text, or null */
+    uint32_t tag;               /* header word at 0 */
+    uint32_t length;            /* header word at 4 */
+    uint32_t relocation_offset; /* R, header word at 8 */
+    uint32_t header_word;       /* word at 12, 60 in a sound file */
+    uint32_t relocation_count;
+    uint32_t string_offset; /* S: first referenced string, or R without strings */
+    uint32_t string_count;  /* string references */
+    char error[160];        /* why the table is not sound; empty when it is */
+} table_check;
+
+/* Checks the bytes of a table file (hex text is detected and decoded).
+ * 1 for a sound table; 0 otherwise, with the reason in result->error.
+ * Either way the result must be released with ReleaseTableCheck. */
+uint8_t CheckTable(const uint8_t *data, size_t size, table_check *result);
+/* Releases what CheckTable allocated; the result then holds no table. */
+void ReleaseTableCheck(table_check *result);
+/* Entry index (below relocation_count) of a checked table. */
+table_relocation TableRelocationAt(const table_check *check, uint32_t index);
+/* The NUL-terminated string at offset of a sound table (a string target). */
+const char *TableStringAt(const table_check *check, uint32_t offset);
+
 #ifdef __cplusplus
 }
 #endif

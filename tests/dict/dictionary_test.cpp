@@ -9,9 +9,11 @@
 #include <string>
 #include <vector>
 
-#include "dict/declarations.h"
-#include "lex/lexer.h"
+#include "base/token.h"
 #include "lex_harness.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 
 using tplex::test::CaptureStdout;
 using tplex::test::describe;

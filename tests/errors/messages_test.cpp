@@ -7,10 +7,14 @@
 #include <memory>
 #include <string>
 
-#include "lex/lexer.h"
+#include "base/token.h"
 #include "scan/char_source.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 #include "source/source_stack.h"
 #include "test_support.h"
+#include "tplex/services.h"
 
 namespace tplex {
 namespace {
@@ -34,10 +38,16 @@ protected:
         source_stack = nullptr;
         source_depth = 0;
     }
+    // What display_error prints, after checking that sg_FormatError
+    // writes the same.
     static std::string display(status_code code) {
         test::CaptureStdout out;
         display_error(code);
-        return out.text();
+        char formatted[TPLEX_DIAGNOSTIC_SIZE];
+        const std::size_t n = sg_FormatError(code, formatted, sizeof formatted);
+        std::string text = out.text();
+        EXPECT_EQ(std::string(formatted, n), text);
+        return text;
     }
     // get_error's result, after checking the prefix it printed.
     static std::string get(status_code code) {
@@ -94,6 +104,20 @@ TEST_F(Messages, Position) {
     }
     source_stack = nullptr;
     EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_frame0);
+}
+
+// A buffer too small gets the diagnostic's start and its NUL; the result
+// is the whole length all the same.
+TEST_F(Messages, FormatCutsToTheBuffer) {
+    const std::string whole = at_main("Bad Character");
+    EXPECT_EQ(sg_FormatError(TPLEX_BAD_CHARACTER, nullptr, 0), whole.size());
+    for (std::size_t size : {1u, 2u, 10u, 40u}) {
+        char buffer[64];
+        std::memset(buffer, 'x', sizeof buffer);
+        EXPECT_EQ(sg_FormatError(TPLEX_BAD_CHARACTER, buffer, size), whole.size());
+        EXPECT_EQ(std::string(buffer), whole.substr(0, size - 1)) << size;
+        EXPECT_EQ(buffer[size], 'x') << size;
+    }
 }
 
 // The position of a file read through the lexer: CR LF arrives as LF.

@@ -31,7 +31,7 @@ step() {
 step "cmake --install" cmake --install "$build" --prefix "$prefix"
 
 # The layout.
-for f in include/tplex/lexer.h include/tplex/table_output.h lib/libtplex.so lib/libtplex.a \
+for f in include/tplex/lexer.h include/tplex/table_output.h include/tplex/services.h lib/libtplex.so lib/libtplex.a \
     lib/pkgconfig/tplex.pc lib/cmake/tplex/tplexConfig.cmake \
     lib/cmake/tplex/tplexConfigVersion.cmake lib/cmake/tplex/tplexTargets.cmake bin/tplex; do
     if [ -e "$prefix/$f" ]; then pass; else fail "not installed: $f"; fi
@@ -65,6 +65,14 @@ step "cc with pkg-config --cflags --libs" "$cc" -std=c99 -Wall -Werror -o "$tmp/
     "$consumer/main.c" $(pkg-config --cflags --libs tplex)
 if out=$(LD_LIBRARY_PATH="$prefix/lib" "$tmp/direct" "$source") && grep -q 'tokens$' <<<"$out"
 then pass; else fail "consumer (pkg-config by hand) on $source: $out"; fi
+# The static archive by hand: the parser services are in it, not in the
+# shared library, so the consumer links libtplex.a.
+# shellcheck disable=SC2046
+step "cc with pkg-config --static" "$cc" -std=c99 -Wall -Werror -DTPLEX_STATIC \
+    -o "$tmp/direct_static" "$consumer/main.c" $(pkg-config --cflags tplex) \
+    -Wl,-Bstatic $(pkg-config --static --libs tplex) -Wl,-Bdynamic
+if out=$("$tmp/direct_static" "$source") && grep -q 'tokens$' <<<"$out"
+then pass; else fail "consumer (static, pkg-config by hand) on $source: $out"; fi
 if [ "$(pkg-config --modversion tplex)" = "$(sed -n 's/.*TPLEX_VERSION_STRING "\(.*\)"/\1/p' \
     "$prefix/include/tplex/lexer.h")" ]; then pass
 else fail "pkg-config --modversion differs from TPLEX_VERSION_STRING"; fi

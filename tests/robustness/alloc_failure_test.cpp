@@ -9,9 +9,9 @@
 #include <string>
 #include <vector>
 
-#include "dict/declarations.h"
+#include "base/memory.h"
 #include "dict/dictionary.h"
-#include "lex/memory.h"
+#include "services/declarations.h"
 #include "test_support.h"
 #include "tplex/lexer.h"
 #include "tplex/table_output.h"

@@ -11,11 +11,14 @@
 #include <string>
 #include <vector>
 
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/lexer.h"
 #include "lex_harness.h"
+#include "scan/char_source.h"
 #include "scan/directives.h"
 #include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 #include "source/source_stack.h"
 
 using tplex::test::LexSession;

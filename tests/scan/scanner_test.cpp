@@ -2,17 +2,21 @@
 // that need long inputs, #include, predefined names, back_token,
 // parse_string and the positions left in the frames. One line per case:
 // tokens in their short form (see lex_harness.h).
+#include "scan/scanner.h"
+
 #include <gtest/gtest.h>
 
 #include <cstring>
 #include <string>
 #include <vector>
 
+#include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex/lexer.h"
 #include "lex_harness.h"
 #include "scan/directives.h"
-#include "scan/string_arg.h"
+#include "services/declarations.h"
+#include "services/string_arg.h"
+#include "session/lifecycle.h"
 
 using tplex::test::describe;
 using tplex::test::err;

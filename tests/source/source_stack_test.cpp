@@ -8,8 +8,11 @@
 #include <memory>
 #include <string>
 
-#include "lex/lexer.h"
+#include "base/token.h"
 #include "scan/char_source.h"
+#include "scan/scanner.h"
+#include "services/declarations.h"
+#include "session/lifecycle.h"
 #include "test_support.h"
 
 namespace tplex {

@@ -61,7 +61,7 @@ status_code string_beyond_r() {  // S + position - 1 must not wrap below R
 }
 
 TEST_F(FailureTest, Codes) {
-    const std::string p = "sg_TableOutput: ", out_of_range = p + "Relocatable out of range\n";
+    const std::string p = "sg_TableOutput: ", out_of_range = p + "relocatable out of range\n";
     expect_failures({
         {allocate_50001, TPLEX_OUT_TOO_MANY_REFERENCES,
          "sg_TableOutput (StoreString): Failed to allocate reference\n", true},
@@ -73,9 +73,9 @@ TEST_F(FailureTest, Codes) {
         {[] { return StoreString("s"), table_output.store.total += 3, CloseOutput(); },
          TPLEX_OUT_STRING_TABLE_DAMAGED, p + "String table integrity damaged\n", true},
         {[] { return DefineReferenceHere(nullptr, 0, 0), CloseOutput(); },
-         TPLEX_OUT_UNUSED_REFERENCE, p + "Relocatable with no references 0\n", true},
+         TPLEX_OUT_UNUSED_REFERENCE, p + "relocatable with no references 0\n", true},
         {[] { return WriteReference(nullptr, 0), DefineReference(1, 0), CloseOutput(); },
-         TPLEX_OUT_UNDEFINED_REFERENCE, p + "Relocatable with no definition\n", true},
+         TPLEX_OUT_UNDEFINED_REFERENCE, p + "relocatable with no definition\n", true},
         {use_beyond_r, TPLEX_OUT_OUT_OF_RANGE, out_of_range, true},
         {string_beyond_r, TPLEX_OUT_OUT_OF_RANGE, out_of_range, true},
         {EndBlock, TPLEX_OUT_NO_OPEN_BLOCK, "", false},

@@ -9,10 +9,10 @@ namespace {
 class ReferencesTest : public TableTest {
 protected:
     // "location>target" of every relocation entry, in file order.
-    static std::string entries(const TableCheck &c) {
+    static std::string entries(const table_check &c) {
         std::string s;
         for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
-            TableRelocation e = table_relocation(c, i);
+            table_relocation e = TableRelocationAt(&c, i);
             s += (i ? " " : "") + std::to_string(e.location) + ">" + std::to_string(e.target);
         }
         return s;
@@ -21,8 +21,8 @@ protected:
     std::string stored(std::uint32_t flags, const char *text) {
         open(flags);
         EXPECT_EQ(StoreString(text), TPLEX_OK);
-        const TableCheck &c = closed();
-        return table_string(c, c.string_offset);
+        const table_check &c = closed();
+        return TableStringAt(&c, c.string_offset);
     }
 };
 
@@ -84,9 +84,9 @@ TEST_F(ReferencesTest, StringsSpillIntoAFurtherChunk) {
     std::string first(9000, 'a'), second(1500, 'b');
     StoreString(first.c_str()), StoreString(second.c_str());
     EXPECT_NE(table_output.store.first->link, nullptr);
-    const TableCheck &c = closed();
+    const table_check &c = closed();
     EXPECT_EQ(entries(c), "16>24 20>9025");
-    EXPECT_EQ(table_string(c, 9025), second);
+    EXPECT_EQ(TableStringAt(&c, 9025), second);
 }
 
 TEST_F(ReferencesTest, Escapes) {

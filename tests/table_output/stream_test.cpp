@@ -13,7 +13,7 @@ protected:
     std::string body(std::uint32_t flags, const std::function<void()> &write) {
         open(flags);
         write();
-        const TableCheck &c = closed();
+        const table_check &c = closed();
         return hex(c.table, 16, c.string_offset);
     }
     // Fill bytes EndBlock adds to a block of n bytes starting `skew` bytes

@@ -22,9 +22,9 @@ protected:
     }
     // check_table's complaint about the bytes, "" for a sound table.
     static std::string error_of(const Bytes &b) {
-        TableCheck c{};
-        std::string error = check_table(b.data(), b.size(), c) ? "" : c.error;
-        release_table_check(c);
+        table_check c{};
+        std::string error = CheckTable(b.data(), b.size(), &c) ? "" : c.error;
+        ReleaseTableCheck(&c);
         return error;
     }
     static Bytes set(Bytes b, std::size_t at, std::uint32_t v) {
@@ -114,11 +114,11 @@ TEST_F(InspectorTest, RoundTrip) {
         for (auto &[which, locations] : uses) {
             for (std::uint32_t at : locations) expected[at] = "@" + std::to_string(targets[which]);
         }
-        const TableCheck &c = closed();
+        const table_check &c = closed();
         ASSERT_EQ(c.relocation_count, expected.size());
         for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
-            TableRelocation e = table_relocation(c, i);
-            ASSERT_EQ(e.is_string ? table_string(c, e.target) : "@" + std::to_string(e.target),
+            table_relocation e = TableRelocationAt(&c, i);
+            ASSERT_EQ(e.is_string ? TableStringAt(&c, e.target) : "@" + std::to_string(e.target),
                       expected[e.location])
                 << "entry " << i;
         }

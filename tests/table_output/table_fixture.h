@@ -14,7 +14,6 @@
 #include <vector>
 
 #include "table_output/references.h"
-#include "table_output/table_check.h"
 #include "test_support.h"
 #include "tplex/table_output.h"
 
@@ -63,7 +62,7 @@ protected:
         AbandonOutput(1), FreeOutputTables(), FreeMemoryOutput();
         while (EndBlock() != TPLEX_OUT_NO_OPEN_BLOCK) {
         }
-        for (TableCheck &c : checks_) release_table_check(c);
+        for (table_check &c : checks_) ReleaseTableCheck(&c);
     }
     void open(std::uint32_t flags = 0, std::uint32_t tag = 0) {
         ASSERT_EQ(OpenOutput(path.c_str(), flags, tag), TPLEX_OK);
@@ -75,17 +74,17 @@ protected:
     bool exists() const { return access(path.c_str(), F_OK) == 0; }
     // Closes and returns the checked table (decoded from hex text if need
     // be), valid until the test ends.
-    const TableCheck &closed() {
+    const table_check &closed() {
         EXPECT_EQ(CloseOutput(), TPLEX_OK);
         const Bytes &b = files_.emplace_back(file());
-        TableCheck &c = checks_.emplace_back();
-        EXPECT_TRUE(check_table(b.data(), b.size(), c)) << c.error;
+        table_check &c = checks_.emplace_back();
+        EXPECT_TRUE(CheckTable(b.data(), b.size(), &c)) << c.error;
         return c;
     }
 
 private:
     std::list<Bytes> files_;
-    std::list<TableCheck> checks_;
+    std::list<table_check> checks_;
 };
 
 }  // namespace tplex::test

@@ -1,30 +1,54 @@
 /* Lexes one file with the installed library and prints its token count.
- * Linked with the static archive (TPLEX_STATIC), it also calls into the
- * table output module, which only the archive carries. */
+ * Linked with the static archive (TPLEX_STATIC), it also uses what only the
+ * archive carries: the parser services, with which it lexes the file a
+ * second time, found through an include directory, and the table output
+ * module. */
 #include <stdio.h>
+#include <string.h>
 #include <tplex/lexer.h>
+#ifdef TPLEX_STATIC
+#include <tplex/services.h>
 #include <tplex/table_output.h>
+#endif
 
-int main(int argc, char **argv) {
-    token_record *token = NULL;
-    status_code r;
+/* Opens name as the main file after dir (if any) is on the include list,
+ * and counts its tokens; -1 on a failure. */
+static int count_tokens(const char *dir, const char *name) {
     int tokens = 0;
-
-    if (argc != 2) {
-        fprintf(stderr, "usage: consumer FILE\n");
-        return 2;
-    }
-    if (sc_lex_init() != 0) return 1;
-    sc_lex_setup(&token, NULL, NULL, NULL, NULL);
-    if (sc_lex_init_file(argv[1]) < 0) return 1;
+    status_code r;
+    if (sc_lex_init() != 0) return -1;
+#ifdef TPLEX_STATIC
+    if (dir != NULL && add_include_dir(dir) != 0) return -1;
+#else
+    (void)dir;
+#endif
+    if (sc_lex_init_file(name) < 0) return -1;
     while ((r = sc_next_token()) >= 0 && r != tk_end_of_input) ++tokens;
     if (r < 0) sg_DisplayError(r);
     sg_closesources();
     lex_free();
+    return r < 0 ? -1 : tokens;
+}
+
+int main(int argc, char **argv) {
+    int tokens;
+    if (argc != 2) {
+        fprintf(stderr, "usage: consumer FILE\n");
+        return 2;
+    }
+    tokens = count_tokens(NULL, argv[1]);
 #ifdef TPLEX_STATIC
-    /* The static archive carries the table output module as well. */
+    {
+        /* The file's own name, searched for in its folder: the same tokens. */
+        char dir[TPLEX_PATH_SIZE];
+        const char *slash = strrchr(argv[1], '/');
+        if (slash == NULL || (size_t)(slash - argv[1]) >= sizeof dir) return 1;
+        memcpy(dir, argv[1], (size_t)(slash - argv[1]));
+        dir[slash - argv[1]] = '\0';
+        if (count_tokens(dir, slash + 1) != tokens) return 1;
+    }
     if (FreeOutputTables() != 0) return 1;
 #endif
     printf("tplex %s: %d tokens\n", TPLEX_VERSION_STRING, tokens);
-    return r < 0 ? 1 : 0;
+    return tokens < 0 ? 1 : 0;
 }

@@ -1,0 +1,25 @@
+// The few compiler attributes the library uses, in one place.
+#ifndef TPLEX_BASE_COMPILER_H
+#define TPLEX_BASE_COMPILER_H
+
+// The per-token path is a handful of small functions; the few that must be
+// inlined into the scan loop, whatever the compiler's own judgement, say so.
+#if defined(__GNUC__)
+#define TPLEX_HOT_INLINE inline __attribute__((always_inline))
+#else
+#define TPLEX_HOT_INLINE inline
+#endif
+
+// printf-style argument checking. MinGW checks against the formats of the C
+// library it links (which know %zu), not Microsoft's.
+#if defined(__MINGW32__)
+#define TPLEX_PRINTF_FORMAT(string_index, first_to_check) \
+    __attribute__((format(__MINGW_PRINTF_FORMAT, string_index, first_to_check)))
+#elif defined(__GNUC__)
+#define TPLEX_PRINTF_FORMAT(string_index, first_to_check) \
+    __attribute__((format(printf, string_index, first_to_check)))
+#else
+#define TPLEX_PRINTF_FORMAT(string_index, first_to_check)
+#endif
+
+#endif
