@@ -8,10 +8,29 @@
 
 #include <cstdint>
 
+#include "scan/directives.h"
 #include "tplex/lexer.h"
 #include "tplex/services.h"
 
 namespace tplex {
+
+// What has been noted since lex_initialise (pass_facts_reset); a further
+// pass keeps the running counts.
+struct pass_facts_state {
+    // Where each region of cond_stack began; entry 0, the whole input, unused.
+    tplex_place region_places[cond_flag_count];
+    struct {
+        bool open = false;           // a block comment is being skipped
+        bool counted = false;        // and has already been counted
+        std::int16_t depth = 0;      // the source depth it began at (0: in a body)
+        std::uint32_t line = 0;      // its line there
+        std::uint32_t past_end = 0;  // comments counted
+        tplex_place ended{};         // the last one counted: the file that ended
+        std::uint32_t opened_line = 0;
+    } comment;
+};
+extern pass_facts_state pass_facts;
+void pass_facts_reset();
 
 // A region has just been pushed at cond_depth by a directive of the
 // current file.

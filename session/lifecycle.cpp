@@ -6,6 +6,7 @@
 #include "dict/keywords.h"
 #include "scan/char_source.h"
 #include "scan/directives.h"
+#include "scan/pass_facts.h"
 #include "scan/scanner.h"
 #include "services/declarations.h"
 #include "source/source_stack.h"
@@ -37,6 +38,7 @@ status_code lex_initialise() {
 
     declarations_init();
     scanner_reset();
+    pass_facts_reset();
     reset_counters();
 
     if (dict_create() != 0 || char_source_create() != 0 || source_stack_create() != 0) {
