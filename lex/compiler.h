@@ -10,6 +10,14 @@
 #define TPLEX_HOT_INLINE inline
 #endif
 
+// A function kept out of its caller, so that the caller's quick path stays
+// small (no registers to save on the way in and out).
+#if defined(__GNUC__)
+#define TPLEX_NOINLINE __attribute__((noinline))
+#else
+#define TPLEX_NOINLINE
+#endif
+
 // printf-style argument checking. MinGW checks against the formats of the C
 // library it links (which know %zu), not Microsoft's.
 #if defined(__MINGW32__)

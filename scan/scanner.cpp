@@ -530,6 +530,101 @@ status_code scan_token() {
     return scan<false>();
 }
 
+namespace {
+
+// An operator that the next character of the same buffer settles: its
+// value and length (1 or 2), or a length of 0 when the general scan must
+// decide (the buffer ends there, or the character may start a comment, a
+// negative number or a PDF string).
+struct quick_op {
+    int32_t value;
+    int length;
+};
+
+TPLEX_HOT_INLINE quick_op quick_operator(const unsigned char *p) {
+    const std::uint8_t c = p[0], n = p[1];
+    switch (dispatch[c]) {
+        case cl_single:
+            return {c, 1};
+        case cl_pair:
+            if (n == 0) break;
+            return n == pairs[c].second ? quick_op{pairs[c].value, 2} : quick_op{c, 1};
+        case cl_less:
+            if (n == 0 || n == '"') break;
+            return n == '=' ? quick_op{op_less_equal, 2}
+                   : n == '<' ? quick_op{op_shift_left, 2}
+                              : quick_op{'<', 1};
+        case cl_greater:
+            if (n == 0) break;
+            return n == '=' ? quick_op{op_greater_equal, 2}
+                   : n == '>' ? quick_op{op_shift_right, 2}
+                              : quick_op{'>', 1};
+        case cl_minus:
+            if (n == 0 || is_digit(n)) break;
+            return {'-', 1};
+        case cl_slash:
+            if (n == 0 || n == '*' || n == '/') break;
+            return n == '=' ? quick_op{op_slash_equal, 2} : quick_op{'/', 1};
+        case cl_star:
+            if (n == 0 || n == '/') break;
+            return {'*', 1};
+        default:
+            break;
+    }
+    return {0, 0};
+}
+
+// The general filter loop below; first is a scan result to start from, or
+// keep_scanning.
+TPLEX_NOINLINE status_code next_token_general(status_code first);
+
+}  // namespace
+
+// The call for every token. Most tokens are a word, a number or an operator
+// after at most one blank, in a live region, with nothing pushed back: those
+// are scanned here, in a function that costs little to enter and leave;
+// everything else (line ends, comments, directives, dead regions, a pushed
+// back token, the end of a buffer) goes to the general filter loop.
+status_code next_token_filtered() {
+    if (push_back_flag != 0 || !region_live()) return next_token_general(keep_scanning);
+    const unsigned char *p = read_cursor;
+    if (is_blank(*p)) ++p;
+    const std::uint8_t c = *p;
+    status_code r;
+    switch (dispatch[c]) {
+        case cl_letter:
+            read_cursor = p + 1;
+            r = scan_word(c);
+            // A name's body, a hash word or a word of kind 0 takes the loop.
+            if (r <= 0 || r == tk_hash_word || r == tk_end_of_line) return next_token_general(r);
+            break;
+        case cl_digit:
+            read_cursor = p + 1;
+            r = scan_number(c, false);
+            break;
+        case cl_quote:
+            read_cursor = p + 1;
+            r = scan_string(false);
+            break;
+        default: {
+            if (c == '-' && is_digit(p[1])) {
+                read_cursor = p + 2;
+                r = scan_number(p[1], true);
+                break;
+            }
+            const quick_op o = quick_operator(p);
+            read_cursor = p + o.length;  // the blank is taken either way
+            if (o.length == 0) return next_token_general(keep_scanning);
+            r = op(o.value);
+            break;
+        }
+    }
+    char_source_store();
+    return r;
+}
+
+namespace {
+
 // Dropping is not free. In a switched-off region, bodies that name bodies
 // several times over can keep one call dropping tokens for ever (four names
 // 20 deep are 4^20 bodies). Past this many tokens dropped from bodies in one
@@ -541,11 +636,11 @@ constexpr unsigned long max_dropped_from_bodies = 1ul << 16;
 // into it: hash words are executed, ends of line dropped (the scan passes
 // over them itself), the end of input delivered whatever the region, and
 // every other result delivered in a live region and dropped in a dead one.
-status_code next_token_filtered() {
-    status_code r;
+TPLEX_NOINLINE status_code next_token_general(status_code first) {
+    status_code r = first;
     unsigned long dropped_from_bodies = 0;
-    for (;;) {
-        r = scan<true>();
+    for (;; r = keep_scanning) {
+        if (r == keep_scanning) r = scan<true>();
         if (r == tk_hash_word) {
             const status_code d = process_hash_directive();
             if (d < 0) {
@@ -564,5 +659,7 @@ status_code next_token_filtered() {
     char_source_store();  // the frame's read_pos is true whenever the parser looks
     return r;
 }
+
+}  // namespace
 
 }  // namespace tplex
