@@ -91,6 +91,20 @@ void drop_macros() {
     macro_depth = 0;
 }
 
+bool next_file_line() {
+    if (cursor_line_pos == nullptr) return false;
+    source_frame &f = source_stack[cur.index];
+    if (!platform::read_line(f.file, f.line_text, line_size)) return false;
+    ++f.line_no;
+    f.read_pos = 0;
+    if (f.line_text[0] != '\0') {
+        read_cursor = cursor_line;
+    } else {
+        drop_cursor();  // a line that starts with a NUL byte: as read_char_slow has it
+    }
+    return true;
+}
+
 std::uint8_t read_char_slow() {
     // The common case first: the file line being read has ended (a valid
     // file cursor means no body is pending and its frame is the current

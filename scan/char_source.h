@@ -42,6 +42,13 @@ extern const unsigned char *cursor_line;
 extern std::uint16_t *cursor_line_pos;
 
 std::uint8_t read_char_slow();
+
+// The cursor has taken the line feed that ends a file's line: when the file
+// has another line, reads it and points the cursor at its start (what the
+// next read_char would do, without taking the first character). false, with
+// nothing changed, when the general path must decide (a pending body, the
+// end of the file).
+bool next_file_line();
 std::uint8_t peek_char_slow();
 
 // Takes the next character.

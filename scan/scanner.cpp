@@ -581,43 +581,54 @@ TPLEX_NOINLINE status_code next_token_general(status_code first);
 }  // namespace
 
 // The call for every token. Most tokens are a word, a number or an operator
-// after at most one blank, in a live region, with nothing pushed back: those
-// are scanned here, in a function that costs little to enter and leave;
-// everything else (line ends, comments, directives, dead regions, a pushed
-// back token, the end of a buffer) goes to the general filter loop.
+// in a live region with nothing pushed back, after blanks and line ends:
+// those are scanned here, in a function that costs little to enter and
+// leave. Everything else (comments, directives, dead regions, a pushed back
+// token, the end of a body or of a file) goes to the general filter loop.
 status_code next_token_filtered() {
     if (push_back_flag != 0 || !region_live()) return next_token_general(keep_scanning);
-    const unsigned char *p = read_cursor;
-    if (is_blank(*p)) ++p;
-    const std::uint8_t c = *p;
     status_code r;
-    switch (dispatch[c]) {
-        case cl_letter:
-            read_cursor = p + 1;
-            r = scan_word(c);
-            // A name's body, a hash word or a word of kind 0 takes the loop.
-            if (r <= 0 || r == tk_hash_word || r == tk_end_of_line) return next_token_general(r);
-            break;
-        case cl_digit:
-            read_cursor = p + 1;
-            r = scan_number(c, false);
-            break;
-        case cl_quote:
-            read_cursor = p + 1;
-            r = scan_string(false);
-            break;
-        default: {
-            if (c == '-' && is_digit(p[1])) {
-                read_cursor = p + 2;
-                r = scan_number(p[1], true);
+    for (;;) {
+        skip_blanks();
+        const unsigned char *p = read_cursor;
+        const std::uint8_t c = *p;
+        switch (dispatch[c]) {
+            case cl_letter:
+                read_cursor = p + 1;
+                r = scan_word(c);
+                // A name's body, a hash word or a word of kind 0 takes the loop.
+                if (r <= 0 || r == tk_hash_word || r == tk_end_of_line)
+                    return next_token_general(r);
+                break;
+            case cl_digit:
+                read_cursor = p + 1;
+                r = scan_number(c, false);
+                break;
+            case cl_quote:
+                read_cursor = p + 1;
+                r = scan_string(false);
+                break;
+            case cl_end_of_line:
+                // A line feed at the end of a file's line: the next line.
+                if (c == '\n') {
+                    read_cursor = p + 1;
+                    if (p[1] != 0 || next_file_line()) continue;
+                }
+                return next_token_general(keep_scanning);
+            default: {
+                if (c == '-' && is_digit(p[1])) {
+                    read_cursor = p + 2;
+                    r = scan_number(p[1], true);
+                    break;
+                }
+                const quick_op o = quick_operator(p);
+                if (o.length == 0) return next_token_general(keep_scanning);
+                read_cursor = p + o.length;
+                r = op(o.value);
                 break;
             }
-            const quick_op o = quick_operator(p);
-            read_cursor = p + o.length;  // the blank is taken either way
-            if (o.length == 0) return next_token_general(keep_scanning);
-            r = op(o.value);
-            break;
         }
+        break;
     }
     char_source_store();
     return r;
