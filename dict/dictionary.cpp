@@ -184,7 +184,7 @@ struct probe_memo {
     std::uint16_t slot;          // where the probe ended
     std::uint8_t found;          // 1: slot holds the name; 0: it is the free slot for it
 };
-constexpr std::size_t memo_count = 1024;  // a power of two
+constexpr std::size_t memo_count = 2048;  // a power of two
 constexpr std::size_t memo_key_max = 16;  // characters of the longest name kept
 
 struct probe_memo_table {
@@ -203,9 +203,9 @@ void new_memo_generation() {
 
 inline probe_memo &memo_for(std::uint64_t w0, std::uint64_t w1) {
     const std::uint64_t h = (w0 ^ (w1 * 0x9E3779B97F4A7C15ull)) * 0xD6E8FEB86659FD93ull;
-    return memos.memo[h >> (64 - 10)];
+    return memos.memo[h >> (64 - 11)];
 }
-static_assert(memo_count == 1u << 10, "memo_for takes 10 bits");
+static_assert(memo_count == 1u << 11, "memo_for takes 11 bits");
 
 // The probe, and its outcome kept for a short name.
 TPLEX_NOINLINE status_code lookup_and_remember(std::size_t length) {

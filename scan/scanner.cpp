@@ -532,48 +532,6 @@ status_code scan_token() {
 
 namespace {
 
-// An operator that the next character of the same buffer settles: its
-// value and length (1 or 2), or a length of 0 when the general scan must
-// decide (the buffer ends there, or the character may start a comment, a
-// negative number or a PDF string).
-struct quick_op {
-    int32_t value;
-    int length;
-};
-
-TPLEX_HOT_INLINE quick_op quick_operator(const unsigned char *p) {
-    const std::uint8_t c = p[0], n = p[1];
-    switch (dispatch[c]) {
-        case cl_single:
-            return {c, 1};
-        case cl_pair:
-            if (n == 0) break;
-            return n == pairs[c].second ? quick_op{pairs[c].value, 2} : quick_op{c, 1};
-        case cl_less:
-            if (n == 0 || n == '"') break;
-            return n == '=' ? quick_op{op_less_equal, 2}
-                   : n == '<' ? quick_op{op_shift_left, 2}
-                              : quick_op{'<', 1};
-        case cl_greater:
-            if (n == 0) break;
-            return n == '=' ? quick_op{op_greater_equal, 2}
-                   : n == '>' ? quick_op{op_shift_right, 2}
-                              : quick_op{'>', 1};
-        case cl_minus:
-            if (n == 0 || is_digit(n)) break;
-            return {'-', 1};
-        case cl_slash:
-            if (n == 0 || n == '*' || n == '/') break;
-            return n == '=' ? quick_op{op_slash_equal, 2} : quick_op{'/', 1};
-        case cl_star:
-            if (n == 0 || n == '/') break;
-            return {'*', 1};
-        default:
-            break;
-    }
-    return {0, 0};
-}
-
 // The general filter loop below; first is a scan result to start from, or
 // keep_scanning.
 TPLEX_NOINLINE status_code next_token_general(status_code first);
@@ -588,10 +546,24 @@ TPLEX_NOINLINE status_code next_token_general(status_code first);
 status_code next_token_filtered() {
     if (push_back_flag != 0 || !region_live()) return next_token_general(keep_scanning);
     status_code r;
+    const unsigned char *p;
+    std::uint8_t c, n;
     for (;;) {
-        skip_blanks();
-        const unsigned char *p = read_cursor;
-        const std::uint8_t c = *p;
+        p = read_cursor;
+        c = *p;
+        if (dispatch[c] == cl_blank) {  // mostly one blank; a run is indentation
+            c = *++p;
+            if (dispatch[c] == cl_blank) {
+                read_cursor = p;
+                skip_blanks();
+                continue;
+            }
+        }
+        n = p[1];
+        r = keep_scanning;  // every scan here ends with a kind or a failure
+        // An operator is taken here when the next character of the same
+        // buffer settles it: not at the buffer's end (n of 0), nor where a
+        // comment, a negative number or a PDF string may begin.
         switch (dispatch[c]) {
             case cl_letter:
                 read_cursor = p + 1;
@@ -610,23 +582,60 @@ status_code next_token_filtered() {
                 break;
             case cl_end_of_line:
                 // A line feed at the end of a file's line: the next line.
-                if (c == '\n') {
-                    read_cursor = p + 1;
-                    if (p[1] != 0 || next_file_line()) continue;
-                }
-                return next_token_general(keep_scanning);
-            default: {
-                if (c == '-' && is_digit(p[1])) {
-                    read_cursor = p + 2;
-                    r = scan_number(p[1], true);
-                    break;
-                }
-                const quick_op o = quick_operator(p);
-                if (o.length == 0) return next_token_general(keep_scanning);
-                read_cursor = p + o.length;
-                r = op(o.value);
+                if (c != '\n') break;
+                read_cursor = p + 1;
+                if (n != 0 || next_file_line()) continue;
+                return next_token_general(keep_scanning);  // the line feed stays taken
+            case cl_single:
+                read_cursor = p + 1;
+                r = op(c);
                 break;
-            }
+            case cl_pair:
+                if (n == 0) break;
+                if (n == pairs[c].second) {
+                    read_cursor = p + 2;
+                    r = op(pairs[c].value);
+                } else {
+                    read_cursor = p + 1;
+                    r = op(c);
+                }
+                break;
+            case cl_less:
+                if (n == 0 || n == '"') break;
+                read_cursor = p + (n == '=' || n == '<' ? 2 : 1);
+                r = op(n == '=' ? int32_t{op_less_equal} : n == '<' ? int32_t{op_shift_left} : '<');
+                break;
+            case cl_greater:
+                if (n == 0) break;
+                read_cursor = p + (n == '=' || n == '>' ? 2 : 1);
+                r = op(n == '=' ? int32_t{op_greater_equal} : n == '>' ? int32_t{op_shift_right} : '>');
+                break;
+            case cl_minus:
+                if (n == 0) break;
+                if (is_digit(n)) {
+                    read_cursor = p + 2;
+                    r = scan_number(n, true);
+                } else {
+                    read_cursor = p + 1;
+                    r = op('-');
+                }
+                break;
+            case cl_slash:
+                if (n == 0 || n == '*' || n == '/') break;
+                read_cursor = p + (n == '=' ? 2 : 1);
+                r = op(n == '=' ? int32_t{op_slash_equal} : '/');
+                break;
+            case cl_star:
+                if (n == 0 || n == '/') break;
+                read_cursor = p + 1;
+                r = op('*');
+                break;
+            default:
+                break;
+        }
+        if (r == keep_scanning) {
+            read_cursor = p;  // the blank is taken either way
+            return next_token_general(keep_scanning);
         }
         break;
     }
