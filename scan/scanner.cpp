@@ -157,18 +157,29 @@ status_code scan_number(std::uint8_t c, bool negative) {
     std::size_t n = 1;
     // Hex digits follow straight from the buffer (they are never comment
     // brackets); one that is no digit of the base is taken, kept in the
-    // text, and ends the number with a failure.
+    // text, and ends the number with a failure. The text keeps word_max
+    // characters; the rest is read and dropped.
     const unsigned char *p = read_cursor;
     if (result >= 0) {
-        for (std::uint8_t d; (d = digit_values[*p]) != no_digit; ++p) {
-            if (n < word_max) t[n++] = static_cast<char>(*p);
-            if (d >= base) {
-                result = TPLEX_BAD_DIGIT;
-                ++p;
-                break;
-            }
-            number = number * base + d;
+        const unsigned char *q = p;
+        for (std::uint8_t d; (d = digit_values[*q]) < base; ++q) number = number * base + d;
+        if (digit_values[*q] != no_digit) {
+            result = TPLEX_BAD_DIGIT;
+            ++q;
         }
+        const auto k = static_cast<std::size_t>(q - p);
+        const std::size_t keep = std::min(k, word_max - n);
+#if defined(__SSE2__)
+        // Most numbers are short: one 16-byte copy (the text has room for it,
+        // and the buffer 16 readable bytes from its NUL on).
+        if (keep <= 16)
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n),
+                             _mm_loadu_si128(reinterpret_cast<const __m128i *>(p)));
+        else
+#endif
+            std::memcpy(t + n, p, keep);
+        n += keep;
+        p = q;
     }
     read_cursor = p;
     t[n] = '\0';
