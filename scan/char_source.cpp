@@ -42,7 +42,7 @@ void store_position() {
 void drop_cursor() {
     cur.owner = cursor_owner::none;
     read_cursor = end_of_buffer;
-    cursor_line_pos = nullptr;
+    cursor_line_pos = &spare_line_pos;
 }
 
 void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t pos) {
@@ -54,7 +54,7 @@ void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t
         cursor_line = cur.base;
         cursor_line_pos = &source_stack[index].read_pos;
     } else {
-        cursor_line_pos = nullptr;
+        cursor_line_pos = &spare_line_pos;
     }
 }
 
@@ -75,7 +75,8 @@ inline std::uint8_t line_char(const source_frame &f) {
 
 const unsigned char *read_cursor = end_of_buffer;
 const unsigned char *cursor_line = end_of_buffer;
-std::uint16_t *cursor_line_pos = nullptr;
+std::uint16_t spare_line_pos = 0;
+std::uint16_t *cursor_line_pos = &spare_line_pos;
 
 void char_source_sync() {
     store_position();
@@ -92,7 +93,7 @@ void drop_macros() {
 }
 
 bool next_file_line() {
-    if (cursor_line_pos == nullptr) return false;
+    if (!cursor_reads_file()) return false;
     source_frame &f = source_stack[cur.index];
     if (!platform::read_line(f.file, f.line_text, line_size)) return false;
     ++f.line_no;
@@ -109,7 +110,7 @@ std::uint8_t read_char_slow() {
     // The common case first: the file line being read has ended (a valid
     // file cursor means no body is pending and its frame is the current
     // one) and the file has another line.
-    if (cursor_line_pos != nullptr) {
+    if (cursor_reads_file()) {
         source_frame &f = source_stack[cur.index];
         if (platform::read_line(f.file, f.line_text, line_size)) {
             ++f.line_no;

@@ -36,10 +36,16 @@ extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index 
 extern std::uint16_t macro_depth;
 
 extern const unsigned char *read_cursor;
-// While the cursor reads a file's line: that line, and its frame's read_pos
-// (null otherwise), so the position can be stored back cheaply.
+// While the cursor reads a file's line: that line, and its frame's read_pos,
+// so the position can be stored back cheaply. Otherwise the position is
+// stored, without a test, into a spare that nothing reads.
 extern const unsigned char *cursor_line;
 extern std::uint16_t *cursor_line_pos;
+extern std::uint16_t spare_line_pos;
+
+inline bool cursor_reads_file() {
+    return cursor_line_pos != &spare_line_pos;
+}
 
 std::uint8_t read_char_slow();
 
@@ -102,8 +108,7 @@ void drop_macros();
 // Stores the read position into its source frame; the cursor stays where
 // it is. (A macro frame's position is internal and stored when needed.)
 inline void char_source_store() {
-    if (cursor_line_pos != nullptr)
-        *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
+    *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
 }
 // The stacks' storage is going away: drop the cursor without storing.
 void char_source_forget();
