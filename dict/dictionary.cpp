@@ -95,16 +95,10 @@ inline std::uint16_t hash_padded(const char *key, std::size_t n) {
 }
 #endif
 
-inline std::uint64_t word_at(const char *p) {
-    std::uint64_t w;
-    std::memcpy(&w, p, sizeof w);
-    return w;
-}
-
 // Equal names, both followed by zero bytes up to a whole word.
 inline bool same_padded(const char *a, const char *b, std::size_t n) {
     for (std::size_t i = 0; i <= n; i += 8)
-        if (word_at(a + i) != word_at(b + i)) return false;
+        if (dict_word_at(a + i) != dict_word_at(b + i)) return false;
     return true;
 }
 
@@ -137,8 +131,10 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
     return no_slot;
 }
 
+}  // namespace
+
 // A found entry's definition, in current_token.
-TPLEX_NOINLINE void show_definition(const hash_definition &d) {
+void dict_show_definition(const hash_definition &d) {
     token_record &t = current_token;
     t.has_definition = 1;
     std::strcpy(t.def_text1, d.text1);
@@ -149,13 +145,15 @@ TPLEX_NOINLINE void show_definition(const hash_definition &d) {
     t.def_flag3 = d.flag3;
 }
 
+namespace {
+
 // A found entry describes itself in current_token.
 TPLEX_HOT_INLINE void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
     if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
     t.value = e.code;
-    if (e.definition != nullptr) show_definition(*e.definition);
+    if (e.definition != nullptr) dict_show_definition(*e.definition);
 }
 
 // A padded key is the token's own text, which already reads as the name.
@@ -171,51 +169,12 @@ status_code lookup_key(const char *key, std::size_t n) {
     return found ? 1 : 0;
 }
 
-// The outcome of recent probes of short words, so a word met again (a
-// reserved word, a name in use) costs two compares instead of a hash and a
-// probe. A name of at most 16 characters followed by zero bytes is its two
-// first words. An outcome holds while no slot changes hands: every insert,
-// removal or clearing starts a new generation, which ends all of them.
-// Kind, code and definition are read from the entry itself, so changing
-// those needs no new generation.
-struct probe_memo {
-    std::uint64_t word0, word1;  // the name, zero-padded
-    std::uint32_t generation;    // 0: empty
-    std::uint16_t slot;          // where the probe ended
-    std::uint8_t found;          // 1: slot holds the name; 0: it is the free slot for it
-};
-constexpr std::size_t memo_count = 2048;  // a power of two
-constexpr std::size_t memo_key_max = 16;  // characters of the longest name kept
-
-struct probe_memo_table {
-    probe_memo memo[memo_count];
-    std::uint32_t generation = 1;
-};
-probe_memo_table memos;
-
 // The slots change hands: every outcome kept so far goes.
 void new_memo_generation() {
-    if (++memos.generation == 0) {  // after 2^32 changes: empty them for real
-        std::memset(memos.memo, 0, sizeof memos.memo);
-        memos.generation = 1;
+    if (++probe_memos.generation == 0) {  // after 2^32 changes: empty them for real
+        std::memset(probe_memos.memo, 0, sizeof probe_memos.memo);
+        probe_memos.generation = 1;
     }
-}
-
-inline probe_memo &memo_for(std::uint64_t w0, std::uint64_t w1) {
-    const std::uint64_t h = (w0 ^ (w1 * 0x9E3779B97F4A7C15ull)) * 0xD6E8FEB86659FD93ull;
-    return memos.memo[h >> (64 - 11)];
-}
-static_assert(memo_count == 1u << 11, "memo_for takes 11 bits");
-
-// The probe, and its outcome kept for a short name.
-TPLEX_NOINLINE status_code lookup_and_remember(std::size_t length) {
-    const token_record &t = current_token;
-    const status_code r = lookup_key<true>(t.text, length);
-    // Nothing is kept without a table, nor when the table is full.
-    if (length > memo_key_max || dict_slots == nullptr || r < 0) return r;
-    const std::uint64_t w0 = word_at(t.text), w1 = word_at(t.text + 8);
-    memo_for(w0, w1) = probe_memo{w0, w1, memos.generation, t.slot, static_cast<std::uint8_t>(r)};
-    return r;
 }
 
 // The entry at current_token.slot, or null for an empty or invalid slot.
@@ -249,24 +208,17 @@ status_code dict_lookup(char *name) {
     return lookup_key<false>(name, key_length(name));
 }
 
-status_code dict_lookup_token(std::size_t length) {
-    // Only a lookup with a table probes and keeps an outcome, and dropping
-    // the table starts a new generation: an outcome that holds implies a table.
-    token_record &t = current_token;
-    const std::uint64_t w0 = word_at(t.text), w1 = word_at(t.text + 8);
-    const probe_memo &m = memo_for(w0, w1);
-    if (length <= memo_key_max && m.word0 == w0 && m.word1 == w1 &&
-        m.generation == memos.generation) {
-        t.has_definition = 0;
-        t.slot = m.slot;
-        if (m.found == 0) return 0;
-        const dict_entry &e = *dict_slots[m.slot];
-        t.kind = e.kind;
-        t.value = e.code;
-        if (e.definition != nullptr) show_definition(*e.definition);
-        return 1;
-    }
-    return lookup_and_remember(length);
+probe_memo_table probe_memos;
+
+status_code dict_lookup_token_probe(std::size_t length) {
+    const token_record &t = current_token;
+    const status_code r = lookup_key<true>(t.text, length);
+    // Nothing is kept without a table, nor when the table is full.
+    if (length > probe_memo_key_max || dict_slots == nullptr || r < 0) return r;
+    const std::uint64_t w0 = dict_word_at(t.text), w1 = dict_word_at(t.text + 8);
+    probe_memo_for(w0, w1) =
+        probe_memo{w0, w1, probe_memos.generation, t.slot, static_cast<std::uint8_t>(r)};
+    return r;
 }
 
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) {
