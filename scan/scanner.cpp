@@ -150,8 +150,10 @@ status_code scan_number(std::uint8_t c, bool negative) {
             c = next_char();  // the first digit, whatever it is
         }
     }
-    std::uint32_t number = 0;
-    status_code result = add_digit(&number, c, base);
+    // The first digit as add_digit takes it: no digit of the base fails.
+    const std::uint8_t first = digit_values[c];
+    status_code result = first < base ? 0 : TPLEX_BAD_DIGIT;
+    std::uint32_t number = result == 0 ? first : 0;
     char *t = tok.text;
     t[0] = static_cast<char>(c);
     std::size_t n = 1;
@@ -619,7 +621,9 @@ status_code next_token_filtered() {
             case cl_greater:
                 if (n == 0) break;
                 read_cursor = p + (n == '=' || n == '>' ? 2 : 1);
-                r = op(n == '=' ? int32_t{op_greater_equal} : n == '>' ? int32_t{op_shift_right} : '>');
+                r = op(n == '='   ? int32_t{op_greater_equal}
+                       : n == '>' ? int32_t{op_shift_right}
+                                  : '>');
                 break;
             case cl_minus:
                 if (n == 0) break;

@@ -1347,7 +1347,9 @@ std::vector<std::string> short_names(Rng &rng, size_t count) {
 class MixGenerator {
 public:
     MixGenerator(Writer &w, Rng &rng, const Mix &mix)
-        : w_(w), rng_(rng), mix_(mix),
+        : w_(w),
+          rng_(rng),
+          mix_(mix),
           vocab_(mix.short_names ? Vocabulary(short_names(rng, mix.names))
                                  : Vocabulary(rng, mix.names, mix.min_len, mix.max_len)) {}
 
@@ -1382,16 +1384,17 @@ private:
         if (r < mix_.str) return w_.string_lit(literal_text(rng_, rng_.range(0, 20), false), false);
         r -= mix_.str;
         if (r < mix_.pdf) return w_.string_lit(literal_text(rng_, rng_.range(0, 20), false), true);
-        w_.char_lit(static_cast<char>(rng_.percent(70) ? 'a' + rng_.below(26) : 32 + rng_.below(95)));
+        w_.char_lit(
+            static_cast<char>(rng_.percent(70) ? 'a' + rng_.below(26) : 32 + rng_.below(95)));
     }
 
     // Operators by how often actions use them; every one has a blank before
     // it except the closers, and a "(" or "[" takes the next token against it.
     void op() {
         static const char *const ops[] = {
-            "(", "(", "(", ")", ")", ")", ",", ",", ",", ",", ":", "=", "=", "=", "+", "+",
-            "-", "-", ".", ".", "[", "]", "*", "/", "<", ">", "<=", ">=", "/=", "!=", "&&",
-            "||", "..", "<<", ">>", "&", "|", "^", "%", "~", "!", "^^", "{", "}"};
+            "(",  "(",  "(",  ")",  ")",  ")", ",", ",", ",", ",", ":", "=",  "=",  "=",  "+",
+            "+",  "-",  "-",  ".",  ".",  "[", "]", "*", "/", "<", ">", "<=", ">=", "/=", "!=",
+            "&&", "||", "..", "<<", ">>", "&", "|", "^", "%", "~", "!", "^^", "{",  "}"};
         const char *s = ops[rng_.below(sizeof ops / sizeof ops[0])];
         w_.op(s);
         if (s[1] == '\0' && (s[0] == '(' || s[0] == '[')) w_.glue_next();
@@ -1406,13 +1409,15 @@ private:
     // lower or capitalised, 1 % in mixed case.
     void kw() {
         static const char *const words[] = {
-            "DCL",   "TASK",   "OUTPUT",   "INPUT",   "STATE",  "NEXTSTATE", "TO",     "AND",
-            "OR",    "NOT",    "INT",      "UINT",    "BYTE",   "FIELD",     "VALUE",  "DECISION",
-            "ELSE",  "SET",    "RESET",    "TIMER",   "NOW",    "TRUE",      "FALSE",  "PROCESS",
-            "SIGNAL", "MESSAGE", "TEMPLATE", "POSITION", "LENGTH", "SENDER",  "VIA",    "WITH",
-            "FROM",  "IN",     "STOP",     "MATCH",   "GENERATE", "CHARSTRING", "ENDSTATE",
-            "ENDDECISION", "SELF", "OFFSPRING", "BOOL", "XOR", "NEXTSTATE", "OUTPUT", "START",
-            "ENDPROCESS", "SIGNALROUTE", "TIMESTAMP", "DURATION"};
+            "DCL",         "TASK",       "OUTPUT",    "INPUT",       "STATE",  "NEXTSTATE",
+            "TO",          "AND",        "OR",        "NOT",         "INT",    "UINT",
+            "BYTE",        "FIELD",      "VALUE",     "DECISION",    "ELSE",   "SET",
+            "RESET",       "TIMER",      "NOW",       "TRUE",        "FALSE",  "PROCESS",
+            "SIGNAL",      "MESSAGE",    "TEMPLATE",  "POSITION",    "LENGTH", "SENDER",
+            "VIA",         "WITH",       "FROM",      "IN",          "STOP",   "MATCH",
+            "GENERATE",    "CHARSTRING", "ENDSTATE",  "ENDDECISION", "SELF",   "OFFSPRING",
+            "BOOL",        "XOR",        "NEXTSTATE", "OUTPUT",      "START",  "ENDPROCESS",
+            "SIGNALROUTE", "TIMESTAMP",  "DURATION"};
         std::string s = words[rng_.below(sizeof words / sizeof words[0])];
         unsigned r = rng_.below(100);
         if (r < 35) {
@@ -1706,7 +1711,7 @@ int main(int argc, char **argv) {
             return usage();
     }
     if (out.empty() || (variant != "plain" && variant != "crlf" && variant != "directive" &&
-                         find_mix(variant) == nullptr))
+                        find_mix(variant) == nullptr))
         return usage();
     Result r = generate(variant, size, seed, out);
     std::printf("file=%s bytes=%" PRIu64 " bytes_read=%" PRIu64 " tokens=%" PRIu64
