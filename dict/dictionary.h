@@ -99,11 +99,11 @@ status_code dict_lookup_token_probe(std::size_t length);
 
 // The scanner's lookup of current_token.text, which it has already
 // upper-cased, whose length (at most 128) it knows, whose characters are
-// ASCII, and which it has followed with 16 zero bytes. Same results as
+// ASCII, and which it has followed with 16 zero bytes; w0 and w1 are the
+// text's first 16 bytes (the scanner has them at hand). Same results as
 // dict_lookup. A kept outcome is used here, in the scan loop.
-inline status_code dict_lookup_token(std::size_t length) {
+inline status_code dict_lookup_token_key(std::size_t length, std::uint64_t w0, std::uint64_t w1) {
     token_record &t = current_token;
-    const std::uint64_t w0 = dict_word_at(t.text), w1 = dict_word_at(t.text + 8);
     const probe_memo &m = probe_memo_for(w0, w1);
     if (length <= probe_memo_key_max && m.word0 == w0 && m.word1 == w1 &&
         m.generation == probe_memos.generation) {
@@ -117,6 +117,11 @@ inline status_code dict_lookup_token(std::size_t length) {
         return 1;
     }
     return dict_lookup_token_probe(length);
+}
+
+inline status_code dict_lookup_token(std::size_t length) {
+    const char *text = current_token.text;
+    return dict_lookup_token_key(length, dict_word_at(text), dict_word_at(text + 8));
 }
 
 // Stores a name at current_token.slot: in a new entry when the slot is

@@ -118,11 +118,55 @@ TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     return n;
 }
 
+// A word whose first character c is taken: its text as take_ident_chars
+// leaves it, its length, and its first 16 bytes of text as the dictionary
+// keys them in key[0] and key[1]. A word of at most 16 characters, the
+// usual one, is done in one 16-byte piece whose key comes from registers:
+// reading it back from the text just written in pieces would wait for the
+// writes to land.
+TPLEX_HOT_INLINE std::size_t take_word(std::uint8_t c, std::uint64_t *key) {
+    char *t = tok.text;
+#if defined(__SSE2__) && defined(__x86_64__)
+    const unsigned char *p = read_cursor;
+    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
+    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
+    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+    const __m128i folded = _mm_or_si128(x, case_bit);
+    const __m128i letter =
+        _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1), _mm_cmplt_epi8(folded, z_plus_1));
+    const __m128i digit =
+        _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1), _mm_cmplt_epi8(x, nine_plus_1));
+    const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
+    const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
+    if (stop != 0) {
+        const auto k = static_cast<unsigned>(__builtin_ctz(stop));  // characters after c
+        const __m128i index = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
+        const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
+        const __m128i name =
+            _mm_and_si128(_mm_or_si128(_mm_slli_si128(up, 1),
+                                       _mm_cvtsi32_si128(static_cast<unsigned char>(upper[c]))),
+                          _mm_cmplt_epi8(index, _mm_set1_epi8(static_cast<char>(k + 1))));
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(t), name);
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(t + 16), _mm_setzero_si128());
+        key[0] = static_cast<std::uint64_t>(_mm_cvtsi128_si64(name));
+        key[1] = static_cast<std::uint64_t>(_mm_cvtsi128_si64(_mm_unpackhi_epi64(name, name)));
+        read_cursor = p + k;
+        return k + 1;
+    }
+#endif
+    t[0] = upper[c];
+    const std::size_t n = take_ident_chars(1);
+    key[0] = dict_word_at(t);
+    key[1] = dict_word_at(t + 8);
+    return n;
+}
+
 // A word: looked up, and expanded in place when it names a body.
 TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c) {
-    tok.text[0] = upper[c];
-    const std::size_t n = take_ident_chars(1);
-    if (dict_lookup_token(n) != 1) tok.kind = tk_new_identifier;
+    std::uint64_t key[2];
+    const std::size_t n = take_word(c, key);
+    if (dict_lookup_token_key(n, key[0], key[1]) != 1) tok.kind = tk_new_identifier;
     if (tok.kind == tk_macro) return push_macro(tok.def_text1);  // 0: scan the body
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
