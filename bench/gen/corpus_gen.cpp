@@ -3,11 +3,14 @@
 // Writes deterministic source text in the protocol and state-machine language
 // (system, protocol and process blocks) and, beside it, the token stream that
 // a conforming lexer must deliver for it, reduced to a token count and the
-// benchmark checksum (bench_common.h). Three variants:
+// benchmark checksum (bench_common.h). Variants:
 //   plain      LF line ends, no directives: every scanner must agree on it;
 //   crlf       the plain text with CR LF line ends (same tokens);
 //   directive  defines used often, nested #ifdef/#ifndef regions and
-//              #include of generated files (written beside the main file).
+//              #include of generated files (written beside the main file);
+//   dense, dense5k, numbers, short
+//              token mixes (see Mix below): lines of tokens drawn by share,
+//              LF line ends, no directives; every scanner must agree on them.
 //
 // The text keeps clear of the corners where scanners may honestly differ:
 // no "/*", "*/" or "//" inside strings, no "*/" outside comments, no "/" or
@@ -15,7 +18,7 @@
 // lines far below 4999 characters, words and numbers below 128 characters and
 // strings below 2499.
 //
-// Usage: corpus_gen --variant plain|crlf|directive --size N[K|M] --seed S --out FILE
+// Usage: corpus_gen --variant VARIANT --size N[K|M] --seed S --out FILE
 
 #include <algorithm>
 #include <cinttypes>
