@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <cstring>
 
+#include "lex/compiler.h"
 #include "lex/lexer.h"
 #include "lex/limits.h"
 #include "tplex/lexer.h"
@@ -38,7 +39,7 @@ struct dict_entry {
     std::uint8_t length;          // characters in name
 };
 
-extern dict_entry **dict_slots;  // dict_slot_count slots; null before lex_initialise
+extern TPLEX_INTERNAL dict_entry **dict_slots;  // dict_slot_count slots; null before lex_initialise
 extern std::uint16_t hash_weights[word_max];
 
 // Fills hash_weights: 64, 32, 16, 8, 4, 2, 1, repeated.
@@ -78,7 +79,7 @@ struct probe_memo_table {
     probe_memo memo[probe_memo_count];
     std::uint32_t generation = 1;
 };
-extern probe_memo_table probe_memos;
+extern TPLEX_INTERNAL probe_memo_table probe_memos;
 
 inline std::uint64_t dict_word_at(const char *p) {
     std::uint64_t w;

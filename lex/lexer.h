@@ -3,14 +3,15 @@
 #ifndef TPLEX_LEX_LEXER_H
 #define TPLEX_LEX_LEXER_H
 
+#include "lex/compiler.h"
 #include "lex/limits.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
 
-extern token_record current_token;  // the token scanned last
-extern uint8_t push_back_flag;      // set by back_token, honoured by scan_token
-extern uint8_t declare_enabled;     // parse_ident declares and checks only while 1
+extern TPLEX_INTERNAL token_record current_token;  // the token scanned last
+extern TPLEX_INTERNAL uint8_t push_back_flag;      // set by back_token, honoured by scan_token
+extern uint8_t declare_enabled;                    // parse_ident declares and checks only while 1
 
 // Allocates the dictionary and both stacks, resets every counter and flag
 // and loads the keywords. 0, or TPLEX_MALLOC_FAILED with nothing kept.

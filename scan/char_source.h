@@ -12,6 +12,7 @@
 
 #include <cstdint>
 
+#include "lex/compiler.h"
 #include "lex/limits.h"
 #include "tplex/lexer.h"
 
@@ -33,15 +34,15 @@ struct macro_frame {
 };
 
 extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1
-extern std::uint16_t macro_depth;
+extern TPLEX_INTERNAL std::uint16_t macro_depth;
 
-extern const unsigned char *read_cursor;
+extern TPLEX_INTERNAL const unsigned char *read_cursor;
 // While the cursor reads a file's line: that line, and its frame's read_pos,
 // so the position can be stored back cheaply. Otherwise the position is
 // stored, without a test, into a spare that nothing reads.
-extern const unsigned char *cursor_line;
-extern std::uint16_t *cursor_line_pos;
-extern std::uint16_t spare_line_pos;
+extern TPLEX_INTERNAL const unsigned char *cursor_line;
+extern TPLEX_INTERNAL std::uint16_t *cursor_line_pos;
+extern TPLEX_INTERNAL std::uint16_t spare_line_pos;
 
 inline bool cursor_reads_file() {
     return cursor_line_pos != &spare_line_pos;

@@ -601,7 +601,10 @@ TPLEX_NOINLINE status_code next_token_general(status_code first);
 // leave. Everything else (comments, directives, dead regions, a pushed back
 // token, the end of a body or of a file) goes to the general filter loop.
 status_code next_token_filtered() {
-    if (push_back_flag != 0 || !region_live()) return next_token_general(keep_scanning);
+    // Outside every region (depth 0, always live) with nothing pushed back:
+    // one test for both.
+    if ((push_back_flag | cond_depth) != 0 && (push_back_flag != 0 || !region_live()))
+        return next_token_general(keep_scanning);
     status_code r;
     const unsigned char *p;
     std::uint8_t c, n;
