@@ -4,11 +4,12 @@
 #ifndef TPLEX_BASE_TOKEN_H
 #define TPLEX_BASE_TOKEN_H
 
+#include "base/compiler.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
 
-extern token_record current_token;
+extern TPLEX_INTERNAL token_record current_token;
 
 }  // namespace tplex
 

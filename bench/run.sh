@@ -7,14 +7,17 @@
 #   bench/run.sh [--size 32M] [--reps 21] [--seed 1] [--callgrind-size 2M]
 #                [--no-callgrind] [--wall] [--build DIR]
 #
+# Corpora: the language's own text (plain, crlf, directive) and four token
+# mixes (dense, dense5k, numbers, short; see gen/corpus_gen.cpp).
+#
 # Columns: MB/s (10^6 bytes per second of the process's CPU time, or of wall
 # time with --wall, from the start of main to the end; median of the runs),
 # million tokens per second, instructions per byte (callgrind, total Ir of
 # the whole process over the bytes read, on a --callgrind-size corpus), peak
 # RSS (ru_maxrss, the largest of the runs) and the time per byte relative to
-# the re2c peer on the plain corpus, as the median of the ratios of runs
-# paired in the same round. Timed runs leave out the checksum (mode -c); the
-# check before them computes it.
+# the re2c peer on the same corpus (on plain for crlf and directive), as the
+# median of the ratios of runs paired in the same round. Timed runs leave
+# out the checksum (mode -c); the check before them computes it.
 set -euo pipefail
 
 here=$(cd "$(dirname "$0")" && pwd)
@@ -36,7 +39,7 @@ while [ $# -gt 0 ]; do
         --no-callgrind) callgrind=0; shift ;;
         --wall) clock=seconds; clock_label="wall time"; shift ;;
         --build) build=$2; shift 2 ;;
-        -h|--help) sed -n '2,19p' "$0"; exit 0 ;;
+        -h|--help) sed -n '2,22p' "$0"; exit 0 ;;
         *) echo "run.sh: unknown option $1 (try --help)" >&2; exit 2 ;;
     esac
 done
@@ -69,13 +72,17 @@ have_tplex=0
 [ $have_tplex -eq 1 ] || echo "!! no libtplex.so yet: the tplex rows are left out"
 
 # ---------------------------------------------------------------- corpora
-# gen DIR SIZE: the three variants into DIR; their expected results into
+# The token mixes, read alike by every scanner; and every corpus.
+mixes="plain dense dense5k numbers short"
+variants="plain crlf directive dense dense5k numbers short"
+
+# gen DIR SIZE: every variant into DIR; their expected results into
 # DIR/expected.txt (one line per variant).
 gen() {
     local dir=$1 sz=$2
     mkdir -p "$dir"
     : >"$dir/expected.txt"
-    for v in plain crlf directive; do
+    for v in $variants; do
         (cd "$dir" && "$bin/corpus_gen" --variant $v --size "$sz" --seed "$seed" --out $v.tpl) \
             >>"$dir/expected.txt"
     done
@@ -94,12 +101,16 @@ echo "== generating the $size corpora in $corpus"
 gen "$corpus" "$size"
 cat "$corpus/expected.txt"
 
-# Rows: label, program, corpus variant.
+# Rows: label, program, corpus variant; every mix's rows together.
 rows=()
-[ $have_tplex -eq 1 ] && rows+=("tplex|tplex_driver|plain" "tplex|tplex_driver|directive" \
-                                "tplex|tplex_driver|crlf")
-rows+=("flex peer|flex_peer|plain" "re2c peer|re2c_peer|plain" \
-       "fread+memchr|ceiling_fread|plain" "fgets|ceiling_fgets|plain")
+for v in $mixes; do
+    [ $have_tplex -eq 1 ] && rows+=("tplex|tplex_driver|$v")
+    if [ $v = plain ] && [ $have_tplex -eq 1 ]; then
+        rows+=("tplex|tplex_driver|directive" "tplex|tplex_driver|crlf")
+    fi
+    rows+=("flex peer|flex_peer|$v" "re2c peer|re2c_peer|$v")
+done
+rows+=("fread+memchr|ceiling_fread|plain" "fgets|ceiling_fgets|plain")
 
 # run PROGRAM MODE FILE [DIR]: one run from the corpus folder; prints the
 # program's closing report (its last line on standard error).
@@ -127,26 +138,27 @@ check() { # check PROGRAM VARIANT
         check_failed=1
     fi
 }
-check flex_peer plain
-check re2c_peer plain
+for v in $mixes; do
+    check flex_peer $v
+    check re2c_peer $v
+done
 if [ $have_tplex -eq 1 ]; then
-    check tplex_driver plain
-    check tplex_driver crlf
-    check tplex_driver directive
+    for v in $variants; do check tplex_driver $v; done
 fi
 if [ $check_failed -ne 0 ]; then
-    # Show where tplex and the re2c peer part on the plain corpus.
-    if [ $have_tplex -eq 1 ]; then
-        (cd "$corpus" && "$bin/re2c_peer" -d plain.tpl >re2c.dump 2>/dev/null || true)
-        (cd "$corpus" && "$bin/tplex_driver" -d plain.tpl >tplex.dump 2>/dev/null || true)
-        first=$(cmp "$corpus/re2c.dump" "$corpus/tplex.dump" 2>/dev/null | awk '{print $NF}')
+    # Show where tplex and the re2c peer part on each mix.
+    for v in $mixes; do
+        [ $have_tplex -eq 1 ] || break
+        (cd "$corpus" && "$bin/re2c_peer" -d $v.tpl >re2c.$v.dump 2>/dev/null || true)
+        (cd "$corpus" && "$bin/tplex_driver" -d $v.tpl >tplex.$v.dump 2>/dev/null || true)
+        first=$(cmp "$corpus/re2c.$v.dump" "$corpus/tplex.$v.dump" 2>/dev/null | awk '{print $NF}')
         if [ -n "$first" ]; then
-            echo "== first difference on plain.tpl, token $first (kind value text):"
-            echo "   re2c:  $(sed -n "${first}p" "$corpus/re2c.dump")"
-            echo "   tplex: $(sed -n "${first}p" "$corpus/tplex.dump")"
-            echo "   (full dumps: $corpus/re2c.dump, $corpus/tplex.dump)"
+            echo "== first difference on $v.tpl, token $first (kind value text):"
+            echo "   re2c:  $(sed -n "${first}p" "$corpus/re2c.$v.dump")"
+            echo "   tplex: $(sed -n "${first}p" "$corpus/tplex.$v.dump")"
+            echo "   (full dumps: $corpus/re2c.$v.dump, $corpus/tplex.$v.dump)"
         fi
-    fi
+    done
     echo "!! the scanners disagree: nothing is timed" >&2
     exit 1
 fi
@@ -192,12 +204,15 @@ if [ $callgrind -eq 1 ]; then
         ipb["$label|$v"]=$(awk -v ir="$ir" -v b="$bytes" 'BEGIN {printf "%.1f", ir / b}')
     done
     if [ $have_tplex -eq 1 ]; then
-        callgrind_annotate --inclusive=no "$results/callgrind.tplex_driver.plain.out" \
-            >"$results/tplex_profile.txt" 2>/dev/null || true
-        callgrind_annotate --inclusive=yes "$results/callgrind.tplex_driver.plain.out" \
-            >"$results/tplex_profile_inclusive.txt" 2>/dev/null || true
-        callgrind_annotate --auto=yes --context=2 "$results/callgrind.tplex_driver.plain.out" \
-            >"$results/tplex_profile_lines.txt" 2>/dev/null || true
+        for v in $mixes; do
+            out="$results/callgrind.tplex_driver.$v.out"
+            callgrind_annotate --inclusive=no "$out" >"$results/tplex_profile.$v.txt" \
+                2>/dev/null || true
+            callgrind_annotate --inclusive=yes "$out" >"$results/tplex_profile_inclusive.$v.txt" \
+                2>/dev/null || true
+            callgrind_annotate --auto=yes --context=2 "$out" \
+                >"$results/tplex_profile_lines.$v.txt" 2>/dev/null || true
+        done
     fi
 fi
 
@@ -211,15 +226,18 @@ table="$results/table.md"
     for r in "${rows[@]}"; do
         IFS='|' read -r label prog v <<<"$r"
         bytes=$(field bytes_read "$(expected "$corpus" $v)")
-        plain_bytes=$(field bytes_read "$(expected "$corpus" plain)")
-        awk -F'|' -v label="$label" -v v="$v" -v bytes="$bytes" -v pb="$plain_bytes" \
+        # The re2c row of the same mix is the measure (plain's for crlf and directive).
+        bv=plain
+        case " $mixes " in *" $v "*) bv=$v ;; esac
+        base_bytes=$(field bytes_read "$(expected "$corpus" $bv)")
+        awk -F'|' -v label="$label" -v v="$v" -v bv="$bv" -v bytes="$bytes" -v pb="$base_bytes" \
             -v ipb="${ipb["$label|$v"]:-n/a}" '
             function median(a, n,   i, j, t) {
                 for (i = 2; i <= n; i++) { t = a[i]; for (j = i - 1; j >= 1 && a[j] > t; j--) a[j + 1] = a[j]; a[j + 1] = t }
                 return n % 2 ? a[(n + 1) / 2] : (a[n / 2] + a[n / 2 + 1]) / 2
             }
             { key = $2 "|" $3 }
-            key == "re2c peer|plain" { base[$1] = $4 }
+            key == "re2c peer|" bv { base[$1] = $4 }
             key == label "|" v { n++; t[n] = $4; round[n] = $1; if ($5 > rss) rss = $5; tok = $6 }
             END {
                 for (i = 1; i <= n; i++) ratio[i] = (t[i] / bytes) / (base[round[i]] / pb)
@@ -231,11 +249,15 @@ table="$results/table.md"
 } >"$table"
 echo
 cat "$table"
-if [ -s "$results/tplex_profile.txt" ]; then
+for v in plain dense; do
+    [ -s "$results/tplex_profile.$v.txt" ] || continue
     echo
-    echo "tplex profile (callgrind, plain $cg_size, self cost), top functions:"
+    echo "tplex profile (callgrind, $v $cg_size, self cost), top functions:"
     awk '/Ir +file:function/ {go = 1; next} go && /^-+$/ {next}
-         go && !NF && n {exit} go && NF {print "  " $0; if (++n == 15) exit}' \
-        "$results/tplex_profile.txt"
-    echo "  (full: $results/tplex_profile.txt; inclusive and by source line beside it)"
+         go && !NF && n {exit} go && NF {print "  " $0; if (++n == 12) exit}' \
+        "$results/tplex_profile.$v.txt"
+done
+if [ -s "$results/tplex_profile.plain.txt" ]; then
+    echo "  (full: $results/tplex_profile.<mix>.txt; inclusive and by source line beside them)"
 fi
+

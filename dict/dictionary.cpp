@@ -108,16 +108,10 @@ inline std::uint16_t hash_padded(const char *key, std::size_t n) {
 }
 #endif
 
-inline std::uint64_t word_at(const char *p) {
-    std::uint64_t w;
-    std::memcpy(&w, p, sizeof w);
-    return w;
-}
-
 // Equal names, both followed by zero bytes up to a whole word.
 inline bool same_padded(const char *a, const char *b, std::size_t n) {
     for (std::size_t i = 0; i <= n; i += 8)
-        if (word_at(a + i) != word_at(b + i)) return false;
+        if (dict_word_at(a + i) != dict_word_at(b + i)) return false;
     return true;
 }
 
@@ -150,22 +144,29 @@ std::uint16_t probe(const char *key, std::size_t n, bool &found) {
     return no_slot;
 }
 
+}  // namespace
+
+// A found entry's definition, in current_token.
+void dict_show_definition(const hash_definition &d) {
+    token_record &t = current_token;
+    t.has_definition = 1;
+    std::strcpy(t.def_text1, d.text1);
+    std::strcpy(t.def_text2, d.text2);
+    std::strcpy(t.def_text3, d.text3);
+    t.def_flag1 = d.flag1;
+    t.def_flag2 = d.flag2;
+    t.def_flag3 = d.flag3;
+}
+
+namespace {
+
 // A found entry describes itself in current_token.
 TPLEX_HOT_INLINE void show_entry(const dict_entry &e, bool text_is_name) {
     token_record &t = current_token;
     t.kind = e.kind;
     if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
     t.value = e.code;
-    if (e.definition != nullptr) {
-        const hash_definition &d = *e.definition;
-        t.has_definition = 1;
-        std::strcpy(t.def_text1, d.text1);
-        std::strcpy(t.def_text2, d.text2);
-        std::strcpy(t.def_text3, d.text3);
-        t.def_flag1 = d.flag1;
-        t.def_flag2 = d.flag2;
-        t.def_flag3 = d.flag3;
-    }
+    if (e.definition != nullptr) dict_show_definition(*e.definition);
 }
 
 // A padded key is the token's own text, which already reads as the name.
@@ -179,6 +180,14 @@ status_code lookup_key(const char *key, std::size_t n) {
     if (found) show_entry(*dict_slots[s], padded);
     current_token.slot = s;
     return found ? 1 : 0;
+}
+
+// The slots change hands: every outcome kept so far goes.
+void new_memo_generation() {
+    if (++probe_memos.generation == 0) {  // after 2^32 changes: empty them for real
+        std::memset(probe_memos.memo, 0, sizeof probe_memos.memo);
+        probe_memos.generation = 1;
+    }
 }
 
 // The entry at current_token.slot, or null for an empty or invalid slot.
@@ -208,8 +217,17 @@ status_code dict_lookup(char *name) {
     return lookup_key<false>(name, key_length(name));
 }
 
-status_code dict_lookup_token(std::size_t length) {
-    return lookup_key<true>(current_token.text, length);
+probe_memo_table probe_memos;
+
+status_code dict_lookup_token_probe(std::size_t length) {
+    const token_record &t = current_token;
+    const status_code r = lookup_key<true>(t.text, length);
+    // Nothing is kept without a table, nor when the table is full.
+    if (length > probe_memo_key_max || dict_slots == nullptr || r < 0) return r;
+    const std::uint64_t w0 = dict_word_at(t.text), w1 = dict_word_at(t.text + 8);
+    probe_memo_for(w0, w1) =
+        probe_memo{w0, w1, probe_memos.generation, t.slot, static_cast<std::uint8_t>(r)};
+    return r;
 }
 
 status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) {
@@ -228,6 +246,7 @@ status_code dict_insert(std::uint8_t kind, std::int16_t code, const char *name) 
         // by the caller) holds another name: never overwrite it.
         return TPLEX_DISASTER;
     }
+    new_memo_generation();
     e->kind = kind;
     std::memset(e->name, 0, sizeof e->name);
     std::memcpy(e->name, name, n);
@@ -248,6 +267,7 @@ void dict_discard() {
     if (e == nullptr) return;
     release_entry(e);
     dict_slots[current_token.slot] = nullptr;
+    new_memo_generation();
 }
 
 void dict_set_kind(std::uint8_t kind, std::int16_t code) {
@@ -294,6 +314,7 @@ status_code dict_create() {
     dict_slots = static_cast<dict_entry **>(mem_alloc(sizeof dict_slots[0] * dict_slot_count));
     if (dict_slots == nullptr) return TPLEX_MALLOC_FAILED;
     for (int s = 0; s < dict_slot_count; ++s) dict_slots[s] = nullptr;
+    new_memo_generation();
     return 0;
 }
 
@@ -303,6 +324,7 @@ void dict_clear() {
         release_entry(dict_slots[s]);
         dict_slots[s] = nullptr;
     }
+    new_memo_generation();
 }
 
 void dict_destroy() {

@@ -7,8 +7,11 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 
+#include "base/compiler.h"
 #include "base/limits.h"
+#include "base/token.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
@@ -37,7 +40,7 @@ struct dict_entry {
 };
 
 // The dictionary's state: dict_slot_count slots, null before dict_create.
-extern dict_entry **dict_slots;
+extern TPLEX_INTERNAL dict_entry **dict_slots;
 
 // The home slot of an upper-case name. Only its first 128 characters count:
 // a longer name is stored, hashed and compared as those 128.
@@ -51,11 +54,73 @@ void dict_upcase(char *name);
 // cleared first, and slot is left at the entry or at the free slot where
 // an insert of this name goes (unchanged when the table is full).
 status_code dict_lookup(char *name);
+// The outcome of recent probes of short words, so that a word met again (a
+// reserved word, a name in use) costs two compares instead of a hash and a
+// probe. A name of at most 16 characters followed by zero bytes is its two
+// first words. An outcome holds while no slot changes hands: every insert,
+// removal or clearing starts a new generation, which ends all of them. Kind,
+// code and definition are read from the entry itself, so changing those
+// needs no new generation. Only a lookup with a table keeps an outcome, and
+// dropping the table starts a new generation: an outcome that holds implies
+// a table.
+struct probe_memo {
+    std::uint64_t word0, word1;  // the name, zero-padded
+    std::uint32_t generation;    // 0: empty
+    std::uint16_t slot;          // where the probe ended
+    std::uint8_t found;          // 1: slot holds the name; 0: it is the free slot for it
+};
+inline constexpr std::size_t probe_memo_count = 2048;  // a power of two
+inline constexpr std::size_t probe_memo_key_max = 16;  // characters of the longest name kept
+
+struct probe_memo_table {
+    probe_memo memo[probe_memo_count];
+    std::uint32_t generation = 1;
+};
+extern TPLEX_INTERNAL probe_memo_table probe_memos;
+
+inline std::uint64_t dict_word_at(const char *p) {
+    std::uint64_t w;
+    std::memcpy(&w, p, sizeof w);
+    return w;
+}
+
+inline probe_memo &probe_memo_for(std::uint64_t w0, std::uint64_t w1) {
+    const std::uint64_t h = (w0 ^ (w1 * 0x9E3779B97F4A7C15ull)) * 0xD6E8FEB86659FD93ull;
+    return probe_memos.memo[h >> (64 - 11)];
+}
+static_assert(probe_memo_count == 1u << 11, "probe_memo_for takes 11 bits");
+
+// A found entry's definition, copied into current_token.
+void dict_show_definition(const hash_definition &d);
+// dict_lookup_token's probe, its outcome kept for a short name.
+status_code dict_lookup_token_probe(std::size_t length);
+
 // The scanner's lookup of current_token.text, which it has already
 // upper-cased, whose length (at most 128) it knows, whose characters are
-// ASCII, and which it has followed with read_slack zero bytes. Same results as
-// dict_lookup.
-status_code dict_lookup_token(std::size_t length);
+// ASCII, and which it has followed with read_slack zero bytes; w0 and w1 are the
+// text's first 16 bytes (the scanner has them at hand). Same results as
+// dict_lookup. A kept outcome is used here, in the scan loop.
+inline status_code dict_lookup_token_key(std::size_t length, std::uint64_t w0, std::uint64_t w1) {
+    token_record &t = current_token;
+    const probe_memo &m = probe_memo_for(w0, w1);
+    if (length <= probe_memo_key_max && m.word0 == w0 && m.word1 == w1 &&
+        m.generation == probe_memos.generation) {
+        t.has_definition = 0;
+        t.slot = m.slot;
+        if (m.found == 0) return 0;
+        const dict_entry &e = *dict_slots[m.slot];
+        t.kind = e.kind;
+        t.value = e.code;
+        if (e.definition != nullptr) dict_show_definition(*e.definition);
+        return 1;
+    }
+    return dict_lookup_token_probe(length);
+}
+
+inline status_code dict_lookup_token(std::size_t length) {
+    const char *text = current_token.text;
+    return dict_lookup_token_key(length, dict_word_at(text), dict_word_at(text + 8));
+}
 
 // Stores a name at current_token.slot: in a new entry when the slot is
 // empty, over the entry there when it holds the same name. 0,

@@ -21,7 +21,8 @@ const unsigned char end_of_buffer[read_slack] = {0};  // a buffer with nothing l
 cursor_origin cursor_from{cursor_owner::none, 0, end_of_buffer};
 const unsigned char *read_cursor = end_of_buffer;
 const unsigned char *cursor_line = end_of_buffer;
-std::uint16_t *cursor_line_pos = nullptr;
+std::uint16_t spare_line_pos = 0;
+std::uint16_t *cursor_line_pos = &spare_line_pos;
 
 namespace {
 
@@ -43,7 +44,7 @@ void store_position() {
 void drop_cursor() {
     cur.owner = cursor_owner::none;
     read_cursor = end_of_buffer;
-    cursor_line_pos = nullptr;
+    cursor_line_pos = &spare_line_pos;
 }
 
 void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t pos) {
@@ -55,7 +56,7 @@ void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t
         cursor_line = cur.base;
         cursor_line_pos = &source_stack[index].read_pos;
     } else {
-        cursor_line_pos = nullptr;
+        cursor_line_pos = &spare_line_pos;
     }
 }
 
@@ -96,11 +97,25 @@ void drop_macros() {
     macro_depth = 0;
 }
 
+bool next_file_line() {
+    if (!cursor_reads_file()) return false;
+    source_frame &f = source_stack[cur.index];
+    if (!platform::read_line(f.file, f.line_text, line_size)) return false;
+    ++f.line_no;
+    f.read_pos = 0;
+    if (f.line_text[0] != '\0') {
+        read_cursor = cursor_line;
+    } else {
+        drop_cursor();  // a line that starts with a NUL byte: as read_char_slow has it
+    }
+    return true;
+}
+
 std::uint8_t read_char_slow() {
     // The common case first: the file line being read has ended (a valid
     // file cursor means no body is pending and its frame is the current
     // one) and the file has another line.
-    if (cursor_line_pos != nullptr) {
+    if (cursor_reads_file()) {
         source_frame &f = source_stack[cur.index];
         if (read_next_line(f)) {
             const auto c = static_cast<std::uint8_t>(f.line_text[0]);

@@ -12,6 +12,7 @@
 
 #include <cstdint>
 
+#include "base/compiler.h"
 #include "base/limits.h"
 #include "tplex/lexer.h"
 
@@ -36,7 +37,7 @@ struct macro_frame {
 // source stack's frames it writes only read_pos, its cursor's place in a
 // line, kept in the frame because the parser reads it there.
 extern macro_frame *macro_stack;  // macro_frame_count frames; depth d is index d - 1
-extern std::uint16_t macro_depth;
+extern TPLEX_INTERNAL std::uint16_t macro_depth;
 
 // The buffer read_cursor points into, so its position can be stored back.
 enum class cursor_owner : std::uint8_t { none, macro, file };
@@ -46,13 +47,26 @@ struct cursor_origin {
     const unsigned char *base;
 };
 extern cursor_origin cursor_from;
-extern const unsigned char *read_cursor;
-// While the cursor reads a file's line: that line, and its frame's read_pos
-// (null otherwise), so the position can be stored back cheaply.
-extern const unsigned char *cursor_line;
-extern std::uint16_t *cursor_line_pos;
+extern TPLEX_INTERNAL const unsigned char *read_cursor;
+// While the cursor reads a file's line: that line, and its frame's read_pos,
+// so the position can be stored back cheaply. Otherwise the position is
+// stored, without a test, into a spare that nothing reads.
+extern TPLEX_INTERNAL const unsigned char *cursor_line;
+extern TPLEX_INTERNAL std::uint16_t *cursor_line_pos;
+extern TPLEX_INTERNAL std::uint16_t spare_line_pos;
+
+inline bool cursor_reads_file() {
+    return cursor_line_pos != &spare_line_pos;
+}
 
 std::uint8_t read_char_slow();
+
+// The cursor has taken the line feed that ends a file's line: when the file
+// has another line, reads it and points the cursor at its start (what the
+// next read_char would do, without taking the first character). false, with
+// nothing changed, when the general path must decide (a pending body, the
+// end of the file).
+bool next_file_line();
 std::uint8_t peek_char_slow();
 
 // Takes the next character.
@@ -118,8 +132,7 @@ status_code close_sources();
 // Stores the read position into its source frame; the cursor stays where
 // it is. (A macro frame's position is internal and stored when needed.)
 inline void char_source_store() {
-    if (cursor_line_pos != nullptr)
-        *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
+    *cursor_line_pos = static_cast<std::uint16_t>(read_cursor - cursor_line);
 }
 
 }  // namespace tplex

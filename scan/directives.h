@@ -5,6 +5,7 @@
 
 #include <cstdint>
 
+#include "base/compiler.h"
 #include "base/limits.h"
 #include "tplex/lexer.h"
 
@@ -12,8 +13,8 @@ namespace tplex {
 
 // Flags of the nested #ifdef/#ifndef regions: 1 delivers, 0 skips. Entry 0
 // is the whole input and is always 1; cond_depth indexes the innermost.
-extern std::uint8_t cond_stack[cond_flag_count];
-extern std::uint16_t cond_depth;
+extern TPLEX_INTERNAL std::uint8_t cond_stack[cond_flag_count];
+extern TPLEX_INTERNAL std::uint16_t cond_depth;
 
 // True while tokens of the current region are delivered.
 inline bool region_live() {

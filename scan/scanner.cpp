@@ -114,11 +114,55 @@ TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     return n;
 }
 
+// A word whose first character c is taken: its text as take_ident_chars
+// leaves it, its length, and its first 16 bytes of text as the dictionary
+// keys them in key[0] and key[1]. A word of at most 16 characters, the
+// usual one, is done in one 16-byte piece whose key comes from registers:
+// reading it back from the text just written in pieces would wait for the
+// writes to land.
+TPLEX_HOT_INLINE std::size_t take_word(std::uint8_t c, std::uint64_t *key) {
+    char *t = tok.text;
+#if defined(__SSE2__) && defined(__x86_64__)
+    const unsigned char *p = read_cursor;
+    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
+    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
+    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+    const __m128i folded = _mm_or_si128(x, case_bit);
+    const __m128i letter =
+        _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1), _mm_cmplt_epi8(folded, z_plus_1));
+    const __m128i digit =
+        _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1), _mm_cmplt_epi8(x, nine_plus_1));
+    const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
+    const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
+    if (stop != 0) {
+        const auto k = static_cast<unsigned>(__builtin_ctz(stop));  // characters after c
+        const __m128i index = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
+        const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
+        const __m128i name =
+            _mm_and_si128(_mm_or_si128(_mm_slli_si128(up, 1),
+                                       _mm_cvtsi32_si128(static_cast<unsigned char>(upper[c]))),
+                          _mm_cmplt_epi8(index, _mm_set1_epi8(static_cast<char>(k + 1))));
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(t), name);
+        _mm_storeu_si128(reinterpret_cast<__m128i *>(t + 16), _mm_setzero_si128());
+        key[0] = static_cast<std::uint64_t>(_mm_cvtsi128_si64(name));
+        key[1] = static_cast<std::uint64_t>(_mm_cvtsi128_si64(_mm_unpackhi_epi64(name, name)));
+        read_cursor = p + k;
+        return k + 1;
+    }
+#endif
+    t[0] = upper[c];
+    const std::size_t n = take_ident_chars(1);
+    key[0] = dict_word_at(t);
+    key[1] = dict_word_at(t + 8);
+    return n;
+}
+
 // A word: looked up, and expanded in place when it names a body.
 TPLEX_HOT_INLINE status_code scan_word(std::uint8_t c) {
-    tok.text[0] = upper[c];
-    const std::size_t n = take_ident_chars(1);
-    if (dict_lookup_token(n) != 1) tok.kind = tk_new_identifier;
+    std::uint64_t key[2];
+    const std::size_t n = take_word(c, key);
+    if (dict_lookup_token_key(n, key[0], key[1]) != 1) tok.kind = tk_new_identifier;
     if (tok.kind == tk_macro) return push_macro(tok.def_text1);  // 0: scan the body
     return tok.kind;  // a kind of 0 keeps the scan going too
 }
@@ -134,25 +178,38 @@ status_code scan_number(std::uint8_t c, bool negative) {
             c = next_char();  // the first digit, whatever it is
         }
     }
-    std::uint32_t number = 0;
-    status_code result = add_digit(&number, c, base);
+    // The first digit as add_digit takes it: no digit of the base fails.
+    const std::uint8_t first = digit_values[c];
+    status_code result = first < base ? 0 : TPLEX_BAD_DIGIT;
+    std::uint32_t number = result == 0 ? first : 0;
     char *t = tok.text;
     t[0] = static_cast<char>(c);
     std::size_t n = 1;
     // Hex digits follow straight from the buffer (they are never comment
     // brackets); one that is no digit of the base is taken, kept in the
-    // text, and ends the number with a failure.
+    // text, and ends the number with a failure. The text keeps word_max
+    // characters; the rest is read and dropped.
     const unsigned char *p = read_cursor;
     if (result >= 0) {
-        for (std::uint8_t d; (d = digit_values[*p]) != no_digit; ++p) {
-            if (n < word_max) t[n++] = static_cast<char>(*p);
-            if (d >= base) {
-                result = TPLEX_BAD_DIGIT;
-                ++p;
-                break;
-            }
-            number = number * base + d;
+        const unsigned char *q = p;
+        for (std::uint8_t d; (d = digit_values[*q]) < base; ++q) number = number * base + d;
+        if (digit_values[*q] != no_digit) {
+            result = TPLEX_BAD_DIGIT;
+            ++q;
         }
+        const auto k = static_cast<std::size_t>(q - p);
+        const std::size_t keep = std::min(k, word_max - n);
+#if defined(__SSE2__)
+        // Most numbers are short: one 16-byte copy (the text has room for it,
+        // and the buffer 16 readable bytes from its NUL on).
+        if (keep <= 16)
+            _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n),
+                             _mm_loadu_si128(reinterpret_cast<const __m128i *>(p)));
+        else
+#endif
+            std::memcpy(t + n, p, keep);
+        n += keep;
+        p = q;
     }
     read_cursor = p;
     t[n] = '\0';
@@ -515,6 +572,126 @@ status_code scan_token() {
     return scan<false>();
 }
 
+namespace {
+
+// The general filter loop below; first is a scan result to start from, or
+// keep_scanning.
+TPLEX_NOINLINE status_code next_token_general(status_code first);
+
+}  // namespace
+
+// The call for every token. Most tokens are a word, a number or an operator
+// in a live region with nothing pushed back, after blanks and line ends:
+// those are scanned here, in a function that costs little to enter and
+// leave. Everything else (comments, directives, dead regions, a pushed back
+// token, the end of a body or of a file) goes to the general filter loop.
+status_code next_token_filtered() {
+    // Outside every region (depth 0, always live) with nothing pushed back:
+    // one test for both.
+    if ((push_back_flag | cond_depth) != 0 && (push_back_flag != 0 || !region_live()))
+        return next_token_general(keep_scanning);
+    status_code r;
+    const unsigned char *p;
+    std::uint8_t c, n;
+    for (;;) {
+        p = read_cursor;
+        c = *p;
+        if (dispatch[c] == cl_blank) {  // mostly one blank; a run is indentation
+            c = *++p;
+            if (dispatch[c] == cl_blank) {
+                read_cursor = p;
+                skip_blanks();
+                continue;
+            }
+        }
+        n = p[1];
+        r = keep_scanning;  // every scan here ends with a kind or a failure
+        // An operator is taken here when the next character of the same
+        // buffer settles it: not at the buffer's end (n of 0), nor where a
+        // comment, a negative number or a PDF string may begin.
+        switch (dispatch[c]) {
+            case cl_letter:
+                read_cursor = p + 1;
+                r = scan_word(c);
+                // A name's body, a hash word or a word of kind 0 takes the loop.
+                if (r <= 0 || r == tk_hash_word || r == tk_end_of_line)
+                    return next_token_general(r);
+                break;
+            case cl_digit:
+                read_cursor = p + 1;
+                r = scan_number(c, false);
+                break;
+            case cl_quote:
+                read_cursor = p + 1;
+                r = scan_string(false);
+                break;
+            case cl_end_of_line:
+                // A line feed at the end of a file's line: the next line.
+                if (c != '\n') break;
+                read_cursor = p + 1;
+                if (n != 0 || next_file_line()) continue;
+                return next_token_general(keep_scanning);  // the line feed stays taken
+            case cl_single:
+                read_cursor = p + 1;
+                r = op(c);
+                break;
+            case cl_pair:
+                if (n == 0) break;
+                if (n == pairs[c].second) {
+                    read_cursor = p + 2;
+                    r = op(pairs[c].value);
+                } else {
+                    read_cursor = p + 1;
+                    r = op(c);
+                }
+                break;
+            case cl_less:
+                if (n == 0 || n == '"') break;
+                read_cursor = p + (n == '=' || n == '<' ? 2 : 1);
+                r = op(n == '=' ? int32_t{op_less_equal} : n == '<' ? int32_t{op_shift_left} : '<');
+                break;
+            case cl_greater:
+                if (n == 0) break;
+                read_cursor = p + (n == '=' || n == '>' ? 2 : 1);
+                r = op(n == '='   ? int32_t{op_greater_equal}
+                       : n == '>' ? int32_t{op_shift_right}
+                                  : '>');
+                break;
+            case cl_minus:
+                if (n == 0) break;
+                if (is_digit(n)) {
+                    read_cursor = p + 2;
+                    r = scan_number(n, true);
+                } else {
+                    read_cursor = p + 1;
+                    r = op('-');
+                }
+                break;
+            case cl_slash:
+                if (n == 0 || n == '*' || n == '/') break;
+                read_cursor = p + (n == '=' ? 2 : 1);
+                r = op(n == '=' ? int32_t{op_slash_equal} : '/');
+                break;
+            case cl_star:
+                if (n == 0 || n == '/') break;
+                read_cursor = p + 1;
+                r = op('*');
+                break;
+            default:
+                break;
+        }
+        if (r == keep_scanning) {
+            read_cursor = p;  // the blank is taken either way
+            return next_token_general(keep_scanning);
+        }
+        break;
+    }
+    char_source_store();
+    return r;
+}
+
+namespace {
+
 // Where reading stands in the current file. While bodies are pending, the
 // file's frame holds its read position, so this changes exactly when a
 // character has been read from a file since.
@@ -535,12 +712,12 @@ constexpr unsigned long max_dropped_from_bodies = 1ul << 22;
 // into it: hash words are executed, ends of line dropped (the scan passes
 // over them itself), the end of input delivered whatever the region, and
 // every other result delivered in a live region and dropped in a dead one.
-status_code next_token_filtered() {
-    status_code r;
+TPLEX_NOINLINE status_code next_token_general(status_code first) {
+    status_code r = first;
     unsigned long dropped_from_bodies = 0;
     std::uint64_t counted_from = 0;
-    for (;;) {
-        r = scan<true>();
+    for (;; r = keep_scanning) {
+        if (r == keep_scanning) r = scan<true>();
         if (r == tk_hash_word) {
             const status_code d = process_hash_directive();
             if (d < 0) {
@@ -574,5 +751,7 @@ status_code next_token_filtered() {
     char_source_store();  // the frame's read_pos is true whenever the parser looks
     return r;
 }
+
+}  // namespace
 
 }  // namespace tplex

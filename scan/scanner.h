@@ -5,12 +5,13 @@
 
 #include <cstdint>
 
+#include "base/compiler.h"
 #include "tplex/lexer.h"
 
 namespace tplex {
 
 // The scanner's state: set by back_token, honoured by the next scan.
-extern std::uint8_t push_back_flag;
+extern TPLEX_INTERNAL std::uint8_t push_back_flag;
 
 // Clears push_back_flag.
 void scanner_reset();

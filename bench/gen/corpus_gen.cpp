@@ -3,11 +3,14 @@
 // Writes deterministic source text in the protocol and state-machine language
 // (system, protocol and process blocks) and, beside it, the token stream that
 // a conforming lexer must deliver for it, reduced to a token count and the
-// benchmark checksum (bench_common.h). Three variants:
+// benchmark checksum (bench_common.h). Variants:
 //   plain      LF line ends, no directives: every scanner must agree on it;
 //   crlf       the plain text with CR LF line ends (same tokens);
 //   directive  defines used often, nested #ifdef/#ifndef regions and
-//              #include of generated files (written beside the main file).
+//              #include of generated files (written beside the main file);
+//   dense, dense5k, numbers, short
+//              token mixes (see Mix below): lines of tokens drawn by share,
+//              LF line ends, no directives; every scanner must agree on them.
 //
 // The text keeps clear of the corners where scanners may honestly differ:
 // no "/*", "*/" or "//" inside strings, no "*/" outside comments, no "/" or
@@ -15,7 +18,7 @@
 // lines far below 4999 characters, words and numbers below 128 characters and
 // strings below 2499.
 //
-// Usage: corpus_gen --variant plain|crlf|directive --size N[K|M] --seed S --out FILE
+// Usage: corpus_gen --variant VARIANT --size N[K|M] --seed S --out FILE
 
 #include <algorithm>
 #include <cinttypes>
@@ -26,6 +29,7 @@
 #include <string>
 #include <unordered_map>
 #include <unordered_set>
+#include <utility>
 #include <vector>
 
 extern "C" {
@@ -298,7 +302,9 @@ private:
 
 class Vocabulary {
 public:
-    explicit Vocabulary(Rng &rng) {
+    // `size` distinct names of min_len to max_len characters, drawn from
+    // roots, prefixes and suffixes; the defaults are the language corpora's.
+    explicit Vocabulary(Rng &rng, size_t size = 950, size_t min_len = 1, size_t max_len = 120) {
         static const char *const roots[] = {
             "link",    "setup",   "release", "ack",      "data",   "conn",    "hdr",      "seq",
             "addr",    "port",    "chan",    "retry",    "frame",  "octet",   "flag",     "mode",
@@ -324,7 +330,7 @@ public:
         const size_t np = sizeof prefixes / sizeof prefixes[0];
         const size_t ns = sizeof suffixes / sizeof suffixes[0];
         std::unordered_set<std::string> seen;
-        while (names_.size() < kSize) {
+        while (names_.size() < size) {
             std::string n = prefixes[rng.below(np)];
             int parts = rng.percent(70) ? 1 : (rng.percent(80) ? 2 : 3);
             for (int i = 0; i < parts; i++) {
@@ -332,22 +338,22 @@ public:
                 n += roots[rng.below(nr)];
             }
             n += suffixes[rng.below(ns)];
-            if (names_.size() % 97 == 13) {  // a few long names
+            if (names_.size() % 97 == 13 && max_len >= 110) {  // a few long names
                 while (n.size() < 60 + rng.below(50)) n += std::string("_") + roots[rng.below(nr)];
             }
             if (n.size() >= 120) n.resize(120);
             if (n.back() == '_') n += 'x';
             std::string styled = style(n, rng);
             std::string u = upper(styled);
+            if (styled.size() < min_len || styled.size() > max_len) continue;
             if (reserved_codes().count(u) || is_hash_word(u) || !seen.insert(u).second) continue;
             names_.push_back(styled);
         }
-        double total = 0;
-        for (size_t i = 0; i < kSize; i++) {
-            total += 1.0 / static_cast<double>(i + 4);
-            cumulative_.push_back(total);
-        }
+        weigh();
     }
+
+    // Names given as they are (the short-name mix builds its own).
+    explicit Vocabulary(std::vector<std::string> names) : names_(std::move(names)) { weigh(); }
 
     // A name drawn by rank r with weight 1/(r+4): the first few take a few
     // percent of all uses each, most are rare.
@@ -355,13 +361,20 @@ public:
         double u = static_cast<double>(rng.next() >> 11) / 9007199254740992.0 * cumulative_.back();
         size_t i =
             std::lower_bound(cumulative_.begin(), cumulative_.end(), u) - cumulative_.begin();
-        return names_[std::min(i, kSize - 1)];
+        return names_[std::min(i, names_.size() - 1)];
     }
 
     const std::vector<std::string> &names() const { return names_; }
-    static constexpr size_t kSize = 950;
 
 private:
+    void weigh() {
+        double total = 0;
+        for (size_t i = 0; i < names_.size(); i++) {
+            total += 1.0 / static_cast<double>(i + 4);
+            cumulative_.push_back(total);
+        }
+    }
+
     static std::string style(const std::string &snake, Rng &rng) {
         unsigned s = rng.below(100);
         if (s < 60) return snake;
@@ -1279,6 +1292,187 @@ private:
 };
 
 // ---------------------------------------------------------------------------
+// Token mixes: statement-shaped lines whose tokens are drawn by share rather
+// than by the grammar, to stress one path of a scanner at a time. LF line
+// ends, no directives, a comment now and then.
+
+struct Mix {
+    const char *name;
+    // Shares of the tokens, in tenths of a percent (they add up to 1000).
+    unsigned op, id, kw, num, str, pdf, chr;
+    // Distinct identifiers and their lengths; short names are 1 to 3 letters
+    // (and a digit), built apart.
+    size_t names, min_len, max_len;
+    bool short_names;
+    // Numbers: percent decimal and hex (the rest binary), percent negative,
+    // and percent of long ones (beyond 32 bits, so their value wraps).
+    unsigned dec, hex, negative, long_num;
+    unsigned indent;  // deepest indentation, in levels of 4 blanks
+};
+
+// dense:    the dense operator-heavy text of a state machine's actions, about
+//           7 bytes a token: operators 44 %, identifiers 24 % (1,000 names of
+//           9 characters on average), reserved words 21.5 %, numbers 9.3 %;
+// dense5k:  the same with 5,000 distinct names, most of them rare;
+// numbers:  tables of numbers in the three bases, half the tokens;
+// short:    short names (1 to 3 characters) in dense expressions.
+const Mix mixes[] = {
+    {"dense", 395, 260, 233, 101, 7, 2, 2, 1000, 5, 12, false, 70, 20, 8, 1, 7},
+    {"dense5k", 395, 260, 233, 101, 7, 2, 2, 5000, 5, 12, false, 70, 20, 8, 1, 7},
+    {"numbers", 380, 70, 50, 496, 2, 1, 1, 300, 4, 14, false, 55, 30, 10, 3, 1},
+    {"short", 470, 330, 120, 76, 2, 1, 1, 400, 1, 3, true, 75, 15, 8, 0, 2},
+};
+
+const Mix *find_mix(const std::string &name) {
+    for (const Mix &m : mixes)
+        if (name == m.name) return &m;
+    return nullptr;
+}
+
+// Names of one to three characters: a letter, then letters or digits; the
+// ones that are reserved words are left out.
+std::vector<std::string> short_names(Rng &rng, size_t count) {
+    static const char alnum[] = "abcdefghijklmnopqrstuvwxyz0123456789";
+    std::vector<std::string> names;
+    std::unordered_set<std::string> seen;
+    while (names.size() < count) {
+        std::string n(1, static_cast<char>('a' + rng.below(26)));
+        int more = rng.percent(25) ? 0 : (rng.percent(60) ? 1 : 2);
+        for (int i = 0; i < more; i++) n += alnum[rng.below(36)];
+        if (rng.percent(30)) n = upper(n);
+        std::string u = upper(n);
+        if (reserved_codes().count(u) || !seen.insert(u).second) continue;
+        names.push_back(n);
+    }
+    return names;
+}
+
+class MixGenerator {
+public:
+    MixGenerator(Writer &w, Rng &rng, const Mix &mix)
+        : w_(w),
+          rng_(rng),
+          mix_(mix),
+          vocab_(mix.short_names ? Vocabulary(short_names(rng, mix.names))
+                                 : Vocabulary(rng, mix.names, mix.min_len, mix.max_len)) {}
+
+    void units(uint64_t target) {
+        while (w_.text_bytes() < target) line();
+    }
+
+private:
+    // One statement: an indentation, a run of tokens, ";" and a line feed.
+    void line() {
+        w_.indent(rng_.range(static_cast<int>(mix_.indent / 3), static_cast<int>(mix_.indent)));
+        int n = rng_.range(4, 16);
+        for (int i = 0; i < n; i++) token();
+        w_.op(";");
+        if (rng_.permille(15)) {
+            w_.blank();
+            w_.raw("// " + comment_text(rng_, rng_.range(2, 8)));
+        }
+        w_.newline();
+    }
+
+    void token() {
+        unsigned r = rng_.below(1000);
+        if (r < mix_.op) return op();
+        r -= mix_.op;
+        if (r < mix_.id) return id();
+        r -= mix_.id;
+        if (r < mix_.kw) return kw();
+        r -= mix_.kw;
+        if (r < mix_.num) return number();
+        r -= mix_.num;
+        if (r < mix_.str) return w_.string_lit(literal_text(rng_, rng_.range(0, 20), false), false);
+        r -= mix_.str;
+        if (r < mix_.pdf) return w_.string_lit(literal_text(rng_, rng_.range(0, 20), false), true);
+        w_.char_lit(
+            static_cast<char>(rng_.percent(70) ? 'a' + rng_.below(26) : 32 + rng_.below(95)));
+    }
+
+    // Operators by how often actions use them; every one has a blank before
+    // it except the closers, and a "(" or "[" takes the next token against it.
+    void op() {
+        static const char *const ops[] = {
+            "(",  "(",  "(",  ")",  ")",  ")", ",", ",", ",", ",", ":", "=",  "=",  "=",  "+",
+            "+",  "-",  "-",  ".",  ".",  "[", "]", "*", "/", "<", ">", "<=", ">=", "/=", "!=",
+            "&&", "||", "..", "<<", ">>", "&", "|", "^", "%", "~", "!", "^^", "{",  "}"};
+        const char *s = ops[rng_.below(sizeof ops / sizeof ops[0])];
+        w_.op(s);
+        if (s[1] == '\0' && (s[0] == '(' || s[0] == '[')) w_.glue_next();
+    }
+
+    void id() {
+        const std::string &n = vocab_.draw(rng_);
+        w_.word(rng_.percent(4) ? upper(n) : n);
+    }
+
+    // Reserved words an action uses most, 5.6 characters on average; upper,
+    // lower or capitalised, 1 % in mixed case.
+    void kw() {
+        static const char *const words[] = {
+            "DCL",         "TASK",       "OUTPUT",    "INPUT",       "STATE",  "NEXTSTATE",
+            "TO",          "AND",        "OR",        "NOT",         "INT",    "UINT",
+            "BYTE",        "FIELD",      "VALUE",     "DECISION",    "ELSE",   "SET",
+            "RESET",       "TIMER",      "NOW",       "TRUE",        "FALSE",  "PROCESS",
+            "SIGNAL",      "MESSAGE",    "TEMPLATE",  "POSITION",    "LENGTH", "SENDER",
+            "VIA",         "WITH",       "FROM",      "IN",          "STOP",   "MATCH",
+            "GENERATE",    "CHARSTRING", "ENDSTATE",  "ENDDECISION", "SELF",   "OFFSPRING",
+            "BOOL",        "XOR",        "NEXTSTATE", "OUTPUT",      "START",  "ENDPROCESS",
+            "SIGNALROUTE", "TIMESTAMP",  "DURATION"};
+        std::string s = words[rng_.below(sizeof words / sizeof words[0])];
+        unsigned r = rng_.below(100);
+        if (r < 35) {
+            for (char &c : s) c = static_cast<char>(c | 0x20);
+        } else if (r < 59) {
+            for (size_t i = 1; i < s.size(); i++) s[i] = static_cast<char>(s[i] | 0x20);
+        } else if (r < 60) {
+            for (char &c : s)
+                if (rng_.percent(50)) c = static_cast<char>(c | 0x20);
+        }
+        w_.word(s);
+    }
+
+    void number() {
+        bool negative = rng_.percent(mix_.negative);
+        bool is_long = rng_.percent(mix_.long_num);
+        unsigned r = rng_.below(100);
+        std::string digits;
+        if (r < mix_.dec) {
+            if (is_long) {
+                digits = std::to_string(1 + rng_.below(9));
+                for (int i = rng_.range(10, 24); i > 0; i--)
+                    digits += static_cast<char>('0' + rng_.below(10));
+            } else {
+                unsigned k = rng_.below(100);
+                digits = std::to_string(k < 60   ? rng_.below(10)
+                                        : k < 85 ? rng_.below(1000)
+                                                 : rng_.below(1000000));
+            }
+            w_.number("", digits, 10, negative);
+        } else if (r < mix_.dec + mix_.hex) {
+            bool lower = rng_.percent(50);
+            int n = is_long ? rng_.range(9, 20) : rng_.range(1, 8);
+            for (int i = 0; i < n; i++) {
+                char c = "0123456789ABCDEF"[rng_.below(16)];
+                digits += lower && c > '9' ? static_cast<char>(c | 0x20) : c;
+            }
+            w_.number(rng_.percent(85) ? "0x" : "0X", digits, 16, negative);
+        } else {
+            int n = is_long ? rng_.range(33, 48) : rng_.range(1, 16);
+            for (int i = 0; i < n; i++) digits += static_cast<char>('0' + rng_.below(2));
+            w_.number(rng_.percent(85) ? "0b" : "0B", digits, 2, negative);
+        }
+    }
+
+    Writer &w_;
+    Rng &rng_;
+    const Mix &mix_;
+    Vocabulary vocab_;
+};
+
+// ---------------------------------------------------------------------------
 // Directive variant: names, bodies and include files.
 
 std::string macro_name(Rng &rng, const Vocabulary &vocab, std::unordered_set<std::string> &used) {
@@ -1410,7 +1604,17 @@ Result generate(const std::string &variant, uint64_t size, uint64_t seed, const 
     Vocabulary vocab(rng);
     Sink sink(false);
     Result res{};
-    if (variant == "plain" || variant == "crlf") {
+    if (const Mix *mix = find_mix(variant)) {
+        FILE *f = open_out(out);
+        {
+            Writer w(f, false, &sink);
+            MixGenerator g(w, rng, *mix);
+            g.units(size);
+            w.flush();
+            res.bytes = res.bytes_read = w.bytes();
+        }
+        std::fclose(f);
+    } else if (variant == "plain" || variant == "crlf") {
         FILE *f = open_out(out);
         {
             Writer w(f, variant == "crlf", &sink);
@@ -1485,7 +1689,8 @@ uint64_t parse_size(const char *s) {
 
 int usage() {
     std::fprintf(stderr,
-                 "usage: corpus_gen --variant plain|crlf|directive --size N[K|M] [--seed S] "
+                 "usage: corpus_gen --variant plain|crlf|directive|dense|dense5k|numbers|short "
+                 "--size N[K|M] [--seed S] "
                  "--out FILE\n");
     return 2;
 }
@@ -1508,7 +1713,8 @@ int main(int argc, char **argv) {
         else
             return usage();
     }
-    if (out.empty() || (variant != "plain" && variant != "crlf" && variant != "directive"))
+    if (out.empty() || (variant != "plain" && variant != "crlf" && variant != "directive" &&
+                        find_mix(variant) == nullptr))
         return usage();
     Result r = generate(variant, size, seed, out);
     std::printf("file=%s bytes=%" PRIu64 " bytes_read=%" PRIu64 " tokens=%" PRIu64

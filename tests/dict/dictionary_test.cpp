@@ -136,6 +136,25 @@ TEST(Dictionary, DefinitionsAndLongNames) {
     EXPECT_EQ(entry(std::string(128, 'k') + "OTHER"), "25:2");
 }
 
+// The scanner keeps the outcome of its recent lookups of short words: every
+// change of the table must reach it.
+TEST(Dictionary, ScannedWordsSeeEveryChangeOfTheTable) {
+    LexSession s;
+    ASSERT_EQ(s.open("w w w w w state"), 1);
+    EXPECT_EQ(describe(LexSession::next()), "id:W");
+    ASSERT_EQ(insert(20, 5, "W"), 0);
+    EXPECT_EQ(describe(LexSession::next()), "k20:5:W");
+    ASSERT_EQ(lookup("W"), 1);
+    dict_discard();
+    EXPECT_EQ(describe(LexSession::next()), "id:W");
+    ASSERT_EQ(insert(21, 6, "W"), 0);
+    dict_set_kind(22, 7);
+    EXPECT_EQ(describe(LexSession::next()), "k22:7:W");
+    dict_clear();
+    EXPECT_EQ(describe(LexSession::next()), "id:W");
+    EXPECT_EQ(describe(LexSession::next()), "id:STATE");  // the keywords went with the rest
+}
+
 // parse_ident's result, then the record's kind and value.
 std::string ident(std::uint8_t declare, std::uint8_t class_) {
     const status_code r = parse_ident(declare, class_);
