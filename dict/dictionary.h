@@ -73,7 +73,7 @@ inline constexpr std::size_t probe_memo_count = 2048;  // a power of two
 inline constexpr std::size_t probe_memo_key_max = 16;  // characters of the longest name kept
 
 struct probe_memo_table {
-    probe_memo memo[probe_memo_count];
+    probe_memo memo[probe_memo_count]{};
     std::uint32_t generation = 1;
 };
 extern TPLEX_INTERNAL probe_memo_table probe_memos;

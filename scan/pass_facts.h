@@ -18,7 +18,7 @@ namespace tplex {
 // pass keeps the running counts.
 struct pass_facts_state {
     // Where each region of cond_stack began; entry 0, the whole input, unused.
-    tplex_place region_places[cond_flag_count];
+    tplex_place region_places[cond_flag_count]{};
     struct {
         bool open = false;           // a block comment is being skipped
         bool counted = false;        // and has already been counted
