@@ -123,8 +123,8 @@ windows_build_and_test() {
         export WINELOADER=/usr/lib/wine/wine64 WINESERVER=/usr/lib/wine/wineserver64
         wine_build_and_test windows64 "$WINELOADER" "$WINESERVER" \
             -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64-x86_64.cmake"
-        ran="32-bit: compile-time layout checks, export table; 64-bit: export table, unit tests, tool tests, C loader (64-bit Wine)"
-        skipped="every 32-bit program at run time, and the 32-bit-only checks (__cdecl, 5212-byte frame stride): $probe_result"
+        ran="32-bit: compile-time layout checks, export table, __cdecl; 64-bit: export table, unit tests, tool tests, C loader (64-bit Wine)"
+        skipped="every 32-bit program at run time (unit tests, tool tests, the C loader with its 5212-byte frame stride check), since $probe_result"
     fi
     echo "== Windows checks that ran: $ran"
     echo "== Windows checks that could not run: $skipped"
