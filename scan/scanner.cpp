@@ -77,28 +77,38 @@ token_record &tok = current_token;
 // an identifier character is never a comment bracket, and a word ends where
 // its buffer (a line piece or a body) ends. Every buffer the cursor reads
 // has 16 readable bytes from its NUL on, so 16 bytes can be looked at once.
+#if defined(__SSE2__)
+// Sixteen bytes classified at once: the upper-case form of each (letters
+// lose their case bit, other bytes stay), and a mask of the bytes that are
+// no identifier character (bit i for byte i).
+struct ident_block {
+    __m128i upper;
+    unsigned stop;
+};
+TPLEX_HOT_INLINE ident_block classify_ident_block(const unsigned char *p) {
+    // Signed compares: bytes from 0x80 up are negative, below every bound.
+    const __m128i case_bit = _mm_set1_epi8(0x20);
+    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
+    const __m128i folded = _mm_or_si128(x, case_bit);
+    const __m128i letter = _mm_and_si128(_mm_cmpgt_epi8(folded, _mm_set1_epi8('a' - 1)),
+                                         _mm_cmplt_epi8(folded, _mm_set1_epi8('z' + 1)));
+    const __m128i digit = _mm_and_si128(_mm_cmpgt_epi8(x, _mm_set1_epi8('0' - 1)),
+                                        _mm_cmplt_epi8(x, _mm_set1_epi8('9' + 1)));
+    const __m128i ident =
+        _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, _mm_set1_epi8('_')));
+    return {_mm_andnot_si128(_mm_and_si128(letter, case_bit), x),
+            ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu};
+}
+#endif
+
 TPLEX_HOT_INLINE std::size_t take_ident_chars(std::size_t n) {
     const unsigned char *p = read_cursor;
     char *t = tok.text;
 #if defined(__SSE2__)
-    // Signed compares: bytes from 0x80 up are negative, below every bound.
-    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
-    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
-    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
     for (;;) {
-        const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
-        const __m128i folded = _mm_or_si128(x, case_bit);
-        const __m128i letter =
-            _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1), _mm_cmplt_epi8(folded, z_plus_1));
-        const __m128i digit =
-            _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1), _mm_cmplt_epi8(x, nine_plus_1));
-        const __m128i ident =
-            _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
-        const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
-        if (n < word_max) {  // letters lose their case bit
-            const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
-            _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n), up);
-        }
+        const ident_block b = classify_ident_block(p);
+        const unsigned stop = b.stop;
+        if (n < word_max) _mm_storeu_si128(reinterpret_cast<__m128i *>(t + n), b.upper);
         const unsigned k = stop != 0 ? static_cast<unsigned>(__builtin_ctz(stop)) : 16u;
         n += k;
         p += k;
@@ -124,21 +134,12 @@ TPLEX_HOT_INLINE std::size_t take_word(std::uint8_t c, std::uint64_t *key) {
     char *t = tok.text;
 #if defined(__SSE2__) && defined(__x86_64__)
     const unsigned char *p = read_cursor;
-    const __m128i a_minus_1 = _mm_set1_epi8('a' - 1), z_plus_1 = _mm_set1_epi8('z' + 1);
-    const __m128i zero_minus_1 = _mm_set1_epi8('0' - 1), nine_plus_1 = _mm_set1_epi8('9' + 1);
-    const __m128i underscore = _mm_set1_epi8('_'), case_bit = _mm_set1_epi8(0x20);
-    const __m128i x = _mm_loadu_si128(reinterpret_cast<const __m128i *>(p));
-    const __m128i folded = _mm_or_si128(x, case_bit);
-    const __m128i letter =
-        _mm_and_si128(_mm_cmpgt_epi8(folded, a_minus_1), _mm_cmplt_epi8(folded, z_plus_1));
-    const __m128i digit =
-        _mm_and_si128(_mm_cmpgt_epi8(x, zero_minus_1), _mm_cmplt_epi8(x, nine_plus_1));
-    const __m128i ident = _mm_or_si128(_mm_or_si128(letter, digit), _mm_cmpeq_epi8(x, underscore));
-    const unsigned stop = ~static_cast<unsigned>(_mm_movemask_epi8(ident)) & 0xFFFFu;
+    const ident_block b = classify_ident_block(p);
+    const unsigned stop = b.stop;
     if (stop != 0) {
         const auto k = static_cast<unsigned>(__builtin_ctz(stop));  // characters after c
         const __m128i index = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
-        const __m128i up = _mm_andnot_si128(_mm_and_si128(letter, case_bit), x);
+        const __m128i up = b.upper;
         const __m128i name =
             _mm_and_si128(_mm_or_si128(_mm_slli_si128(up, 1),
                                        _mm_cvtsi32_si128(static_cast<unsigned char>(upper[c]))),
