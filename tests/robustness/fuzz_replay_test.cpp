@@ -5,7 +5,6 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <cctype>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -20,64 +19,38 @@
 namespace {
 
 namespace fs = std::filesystem;
+using Harness = void (*)(const std::uint8_t *, std::size_t);
 
-std::vector<std::string> inputs_of(const std::string &target) {
-    std::vector<std::string> files;
-    for (const fs::path &dir : {fs::path(TPLEX_SOURCE_DIR) / "tests/robustness/crashes" / target,
-                                fs::path(TPLEX_SOURCE_DIR) / "fuzz/corpus" / target}) {
+void replay(const std::string &target, Harness harness) {
+    std::vector<fs::path> files;
+    for (const char *dir : {"tests/robustness/crashes/", "fuzz/corpus/"}) {
         std::error_code ec;
-        for (const auto &e : fs::directory_iterator(dir, ec))
-            if (e.is_regular_file()) files.push_back(e.path().string());
+        for (const auto &e : fs::directory_iterator(fs::path(TPLEX_SOURCE_DIR) / dir / target, ec))
+            if (e.is_regular_file()) files.push_back(e.path());
     }
+    EXPECT_FALSE(files.empty()) << target;
     std::sort(files.begin(), files.end());
-    return files;
+    for (const fs::path &file : files) {
+        SCOPED_TRACE(file.string());
+        std::ifstream in(file, std::ios::binary);
+        const std::string data{std::istreambuf_iterator<char>(in),
+                               std::istreambuf_iterator<char>()};
+        tplex::test::Capture quiet;
+        harness(reinterpret_cast<const std::uint8_t *>(data.data()), data.size());
+    }
 }
 
-std::string read_file(const std::string &path) {
-    std::ifstream in(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+TEST(FuzzReplay, Lexer) {
+    replay("lexer", tplex::fuzz::run_lexer);
 }
-
-// "crashes/lexer/hang-x" becomes crashes_hang_x.
-std::string case_name(const ::testing::TestParamInfo<std::string> &info) {
-    const fs::path p(info.param);
-    std::string name =
-        p.parent_path().parent_path().filename().string() + "_" + p.filename().string();
-    for (char &c : name)
-        if (!std::isalnum(static_cast<unsigned char>(c))) c = '_';
-    return name;
+TEST(FuzzReplay, TableOutput) {
+    replay("table_output", tplex::fuzz::run_table_output);
 }
-
-void replay(void (*harness)(const std::uint8_t *, std::size_t), const std::string &file) {
-    const std::string data = read_file(file);
-    tplex::test::CaptureStdout quiet;
-    harness(reinterpret_cast<const std::uint8_t *>(data.data()), data.size());
+TEST(FuzzReplay, TableCheck) {
+    replay("table_check", tplex::fuzz::run_table_check);
 }
-
-class LexerReplay : public ::testing::TestWithParam<std::string> {};
-class TableOutputReplay : public ::testing::TestWithParam<std::string> {};
-class TableCheckReplay : public ::testing::TestWithParam<std::string> {};
-class FileNamesReplay : public ::testing::TestWithParam<std::string> {};
-
-TEST_P(LexerReplay, RunsClean) {
-    replay(tplex::fuzz::run_lexer, GetParam());
+TEST(FuzzReplay, FileNames) {
+    replay("file_names", tplex::fuzz::run_file_names);
 }
-TEST_P(TableOutputReplay, RunsClean) {
-    replay(tplex::fuzz::run_table_output, GetParam());
-}
-TEST_P(TableCheckReplay, RunsClean) {
-    replay(tplex::fuzz::run_table_check, GetParam());
-}
-TEST_P(FileNamesReplay, RunsClean) {
-    replay(tplex::fuzz::run_file_names, GetParam());
-}
-
-INSTANTIATE_TEST_SUITE_P(Inputs, LexerReplay, ::testing::ValuesIn(inputs_of("lexer")), case_name);
-INSTANTIATE_TEST_SUITE_P(Inputs, TableOutputReplay, ::testing::ValuesIn(inputs_of("table_output")),
-                         case_name);
-INSTANTIATE_TEST_SUITE_P(Inputs, TableCheckReplay, ::testing::ValuesIn(inputs_of("table_check")),
-                         case_name);
-INSTANTIATE_TEST_SUITE_P(Inputs, FileNamesReplay, ::testing::ValuesIn(inputs_of("file_names")),
-                         case_name);
 
 }  // namespace

@@ -3,13 +3,15 @@
 #include <fcntl.h>
 
 #include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <stdexcept>
 #ifdef _WIN32
 #include <io.h>
 #include <sys/stat.h>
+#define dup _dup
+#define dup2 _dup2
+#define close _close
 #else
 #include <unistd.h>
 #endif
@@ -20,42 +22,27 @@ namespace tplex::test {
 
 namespace {
 
+// A name from the pattern that did not exist yet; creating it may still lose
+// a race with another process, so try again a few times.
 #ifdef _WIN32
-// The C runtime's names for the POSIX descriptor calls.
-int dup(int fd) {
-    return _dup(fd);
-}
-int dup2(int from, int to) {
-    return _dup2(from, to);
-}
-int close(int fd) {
-    return _close(fd);
-}
-
-// _mktemp_s picks a name that does not exist yet; creating it can still
-// lose a race with another process, so try again a few times.
 std::string make_temp_dir(const std::string &pattern) {
     for (int attempt = 0; attempt < 100; ++attempt) {
         std::string name = pattern;
-        if (_mktemp_s(name.data(), name.size() + 1) != 0) break;
         std::error_code ec;
-        if (fs::create_directory(name, ec)) return name;
+        if (_mktemp_s(name.data(), name.size() + 1) == 0 && fs::create_directory(name, ec))
+            return name;
     }
     throw std::runtime_error("cannot create a temporary folder");
 }
 
-// Binary mode: captured text is what the library wrote, without the CR
-// that text mode would put before each line feed on the console.
+// Binary: the captured text is what was written, without text mode's CRs.
 int make_temp_file(std::string &name) {
     for (int attempt = 0; attempt < 100; ++attempt) {
         std::string candidate = name;
         if (_mktemp_s(candidate.data(), candidate.size() + 1) != 0) break;
         int fd = _open(candidate.c_str(), _O_CREAT | _O_EXCL | _O_RDWR | _O_BINARY,
                        _S_IREAD | _S_IWRITE);
-        if (fd >= 0) {
-            name = candidate;
-            return fd;
-        }
+        if (fd >= 0) return name = candidate, fd;
     }
     return -1;
 }
@@ -83,42 +70,35 @@ TempDir::~TempDir() {
 std::string TempDir::write(const std::string &name, const std::string &bytes) const {
     fs::path full = fs::path(path_) / name;
     fs::create_directories(full.parent_path());
-    std::ofstream out(full, std::ios::binary);
-    out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
+    std::ofstream(full, std::ios::binary).write(bytes.data(), std::streamsize(bytes.size()));
     return full.string();
 }
 
-std::string TempDir::mkdir(const std::string &name) const {
-    fs::path full = fs::path(path_) / name;
-    fs::create_directories(full);
-    return full.string();
+Capture::Capture(int fd) : fd_(fd) {
+    std::fflush(fd == 1 ? stdout : stderr);
+    file_ = (fs::temp_directory_path() / "tplex-capture-XXXXXX").string();
+    int out = make_temp_file(file_);
+    if (out < 0) throw std::runtime_error("cannot create a capture file");
+    saved_ = dup(fd);
+    dup2(out, fd);
+    close(out);
 }
 
-CaptureStdout::CaptureStdout() {
-    std::fflush(stdout);
-    file_ = (fs::temp_directory_path() / "tplex-stdout-XXXXXX").string();
-    int fd = make_temp_file(file_);
-    if (fd < 0) throw std::runtime_error("cannot create a capture file");
-    saved_fd_ = dup(1);
-    dup2(fd, 1);
-    close(fd);
-}
-
-CaptureStdout::~CaptureStdout() {
+Capture::~Capture() {
     text();
 }
 
-std::string CaptureStdout::text() {
-    if (!done_) {
-        std::fflush(stdout);
-        dup2(saved_fd_, 1);
-        close(saved_fd_);
+std::string Capture::text() {
+    if (done_) return captured_;
+    std::fflush(fd_ == 1 ? stdout : stderr);
+    dup2(saved_, fd_);
+    close(saved_);
+    {
         std::ifstream in(file_, std::ios::binary);
         captured_.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-        in.close();
-        std::remove(file_.c_str());
-        done_ = true;
     }
+    std::remove(file_.c_str());
+    done_ = true;
     return captured_;
 }
 

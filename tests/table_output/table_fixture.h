@@ -1,5 +1,5 @@
-// Helpers of the table output tests: a fixture that owns a temporary table
-// file and resets the module, a standard error capture, and byte helpers.
+// The table output tests' fixture: a temporary table file, the module reset
+// after each test, and byte helpers.
 #ifndef TPLEX_TESTS_TABLE_FIXTURE_H
 #define TPLEX_TESTS_TABLE_FIXTURE_H
 
@@ -21,26 +21,7 @@ namespace tplex::test {
 
 using Bytes = std::vector<std::uint8_t>;
 
-// Captures file descriptor 2 (and so stderr) until text().
-class CaptureStderr {
-public:
-    CaptureStderr() : file_(std::tmpfile()), saved_(dup(2)) { dup2(fileno(file_), 2); }
-    ~CaptureStderr() { text(); }
-    std::string text() {
-        if (file_ == nullptr) return captured_;
-        dup2(saved_, 2), close(saved_), std::rewind(file_);
-        for (int c; (c = std::fgetc(file_)) != EOF;) captured_ += static_cast<char>(c);
-        std::fclose(file_), file_ = nullptr;
-        return captured_;
-    }
-
-private:
-    std::FILE *file_;
-    int saved_;
-    std::string captured_;
-};
-
-// "3c 01 ff": bytes from..to as lower-case hex, for readable comparisons.
+// "3c 01 ff": bytes from..to as lower-case hex.
 inline std::string hex(const std::uint8_t *b, std::size_t from, std::size_t to) {
     std::string s;
     char item[4];
@@ -56,8 +37,7 @@ protected:
     TempDir dir;
     std::string path = dir.path() + "/out.tbl";
 
-    // The block stack outlives an output: leave no block open for the next
-    // test (RoundTrip leaves some), whatever order the tests run in.
+    // The block stack outlives an output: leave no block open for the next test.
     void TearDown() override {
         AbandonOutput(1), FreeOutputTables(), FreeMemoryOutput();
         while (EndBlock() != TPLEX_OUT_NO_OPEN_BLOCK) {
