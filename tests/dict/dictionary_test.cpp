@@ -9,10 +9,9 @@
 #include <cstdio>
 #include <cstring>
 #include <string>
-#include <vector>
 
 #include "base/token.h"
-#include "lex_harness.h"
+#include "test_support.h"
 #include "tplex/services.h"
 
 namespace tplex {
@@ -67,18 +66,6 @@ TEST(Dictionary, HashAndKeywordSlots) {
     EXPECT_STREQ(tok.text, "UINT");
 }
 
-TEST(Dictionary, AMissTouchesOnlySlotAndDefinitionFlag) {
-    LexSession s;
-    current_token.kind = 77;
-    current_token.has_definition = 1;
-    EXPECT_EQ(lookup("newname"), 0);
-    EXPECT_EQ(tok.kind * 10 + tok.has_definition, 770);
-    const std::uint16_t free_slot = tok.slot;
-    EXPECT_EQ(dict_insert(20, -1, "NEWNAME"), 0);
-    EXPECT_EQ(entry("NewName"), "20:-1");  // codes are sign-extended
-    EXPECT_EQ(tok.slot, free_slot);
-}
-
 TEST(Dictionary, ProbeWrapsAndAFullTableOverwritesNothing) {
     LexSession s;
     dict_clear();
@@ -96,9 +83,15 @@ TEST(Dictionary, ProbeWrapsAndAFullTableOverwritesNothing) {
     EXPECT_EQ(entry("N0") + entry("N1661"), "20:120:1");
 }
 
+// A miss touches only the slot and the definition flag; codes are sign-extended.
 TEST(Dictionary, DefinitionsAndLongNames) {
     LexSession s;
-    EXPECT_EQ(insert(20, 1, "FIELDNAME"), 0);
+    current_token.kind = 77;
+    current_token.has_definition = 1;
+    EXPECT_EQ(lookup("fieldname"), 0);
+    EXPECT_EQ(tok.kind * 10 + tok.has_definition, 770);
+    EXPECT_EQ(dict_insert(20, -1, "FIELDNAME"), 0);
+    EXPECT_EQ(entry("FieldName"), "20:-1");
     EXPECT_EQ(dict_extend(std::string(4000, 'x').c_str(), "two", "three", 4, 5, 6), 0);
     EXPECT_EQ(tok.has_definition, 0) << "not before the next lookup";
     EXPECT_EQ(lookup("fieldname"), 1);
@@ -133,36 +126,27 @@ std::string listing(std::uint8_t all, const std::string &keys, int *next_key = n
 }
 
 // A line per entry in slot order, "Press a key" after the 9th, 19th...; with
-// all = 0 no reserved words and hash words.
+// all = 0 no reserved words (C) and hash words (F).
 TEST(Listing, EntriesInSlotOrderWithPauses) {
     LexSession s;
     EXPECT_EQ(listing(0, ""), "\n End of Listing \n");
     const std::string keywords = listing(1, "");
     EXPECT_EQ(std::count(keywords.begin(), keywords.end(), '\n'), 123 + 12 + 2);  // 12 pauses
     dict_clear();
-    const std::vector<std::pair<int, std::string>> kinds = {
-        {2, "String"},   {4, "Unknown"},    {9, "Reserved Word"},    {10, "Identifier"},
-        {12, "Unknown"}, {24, "Hash Word"}, {25, "Hash Definition"}, {33, "PDF String"},
-        {34, "Char"},    {16, "Unknown"}};
-    std::vector<std::pair<int, std::string>> lines;  // slot, line, kind
-    for (const auto &[kind, name] : kinds) {
-        const std::string word = "K" + std::to_string(kind);
-        ASSERT_EQ(insert(static_cast<std::uint8_t>(kind), 0, word), 0);
-        char line[64];
-        std::snprintf(line, sizeof line, "\n%4d   %-15s   %s", tok.slot, name.c_str(),
-                      word.c_str());
-        lines.emplace_back(tok.slot, line + std::string(kind == 9 || kind == 24 ? "*" : ""));
-    }
-    std::sort(lines.begin(), lines.end());
-    std::string some, every;
-    for (const auto &[slot, line] : lines) {
-        if (line.back() != '*') some += line;
-        every +=
-            line.substr(0, line.find('*')) + (&line == &lines[8].second ? "\n  Press a key" : "");
-    }
-    EXPECT_EQ(listing(0, ""), some + "\n End of Listing \n");
+    int slot = 0;
+    for (int kind : {2, 4, 9, 10, 12, 24, 25, 33, 34, 16})  // A, B, C... at slots 0, 64, 128...
+        ASSERT_EQ(insert(std::uint8_t(kind), 0, std::string(1, char('A' + slot++))), 0);
+    const std::string a_b = "\n   0   String            A\n  64   Unknown           B",
+                      d_e = "\n 192   Identifier        D\n 256   Unknown           E",
+                      g_i =
+                          "\n 384   Hash Definition   G\n 448   PDF String        H"
+                          "\n 512   Char              I",
+                      j = "\n 576   Unknown           J", end = "\n End of Listing \n";
+    EXPECT_EQ(listing(0, ""), a_b + d_e + g_i + j + end);
     int next_key = 0;
-    EXPECT_EQ(listing(1, std::string("\0\0xyz", 5), &next_key), every + "\n End of Listing \n");
+    EXPECT_EQ(listing(1, std::string("\0\0xyz", 5), &next_key),
+              a_b + "\n 128   Reserved Word     C" + d_e + "\n 320   Hash Word         F" + g_i +
+                  "\n  Press a key" + j + end);
     EXPECT_EQ(next_key, 'y') << "a pause waits for a character that is not NUL";
 }
 

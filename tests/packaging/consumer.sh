@@ -46,10 +46,6 @@ step "pkg-config module" cmake -S "$consumer" -B "$tmp/pc" -DCMAKE_C_COMPILER="$
 step "build with pkg-config" cmake --build "$tmp/pc"
 step "consumer (pkg-config module)" counts env LD_LIBRARY_PATH="$lib" "$tmp/pc/consumer"
 # shellcheck disable=SC2046
-step "cc with pkg-config --cflags --libs" "$cc" -std=c99 -Wall -Werror -o "$tmp/direct" \
-    "$consumer/main.c" $(pkg-config --cflags --libs tplex)
-step "consumer (pkg-config by hand)" counts env LD_LIBRARY_PATH="$lib" "$tmp/direct"
-# shellcheck disable=SC2046
 step "cc with pkg-config --static" "$cc" -std=c99 -Wall -Werror -DTPLEX_STATIC -o "$tmp/static" \
     "$consumer/main.c" $(pkg-config --cflags tplex) -Wl,-Bstatic $(pkg-config --static --libs tplex) -Wl,-Bdynamic
 step "consumer (static, pkg-config by hand)" counts "$tmp/static"

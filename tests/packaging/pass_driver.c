@@ -55,14 +55,22 @@ static status_code(TPLEX_CALL *p_sg_closesources)(void);
 
 #ifdef _WIN32
 #define LOAD_LIBRARY(path) ((void *)LoadLibraryA(path))
-#define FIND(lib, name) ((void *)GetProcAddress((HMODULE)(lib), name))
 #else
 #define LOAD_LIBRARY(path) dlopen(path, RTLD_NOW | RTLD_LOCAL)
-#define FIND(lib, name) dlsym(lib, name)
 #endif
+static void *find(void *lib, const char *name) {
+#ifdef _WIN32
+    FARPROC proc = GetProcAddress((HMODULE)lib, name);
+    void *sym;
+    memcpy(&sym, &proc, sizeof sym);
+    return sym;
+#else
+    return dlsym(lib, name);
+#endif
+}
 /* The symbol's address copied into the function pointer. */
 #define LOAD(name) \
-    (sym = FIND(lib, #name), CHECK(sym != NULL), memcpy(&p_##name, &sym, sizeof p_##name))
+    (sym = find(lib, #name), CHECK(sym != NULL), memcpy(&p_##name, &sym, sizeof p_##name))
 
 static token_record *tok;
 static source_frame *frames;

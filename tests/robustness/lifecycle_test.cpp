@@ -1,13 +1,11 @@
 // Whole lives of the lexer (initialise, predefine, passes with includes and
-// defines, close, free) and of table outputs leave no file open and, under
-// LeakSanitizer, no memory behind.
+// defines, close, free) leave no file open and, under LeakSanitizer, no memory.
 #include <gtest/gtest.h>
 
 #include <filesystem>
 #include <string>
 
-#include "lex_harness.h"
-#include "tplex/table_output.h"
+#include "test_support.h"
 
 namespace tplex::test {
 namespace {
@@ -40,7 +38,7 @@ TEST(Lifecycle, LivesLeaveNothingOpen) {
         "#define MAX 10\n#include \"a.src\"\nPROTOCOL MAX\n#ifndef DEBUG\nhidden\n#endif\nlast\n");
     dir.write("a.src", "#include \"b.src\"\nin_a\n");
     dir.write("b.src", "in_b <\"pdf\">\n");
-    ChangeDir here(dir.path());
+    ChangeDir here(dir.path);
     const int fds = open_fds();
     const std::string tokens = "id:IN_B pdf:pdf id:IN_A rw:0 n:10:10 id:LAST eof";
     for (int i = 0; i < 10; ++i) ASSERT_EQ(life(), tokens) << "life " << i;
@@ -54,32 +52,6 @@ TEST(Lifecycle, LivesLeaveNothingOpen) {
     EXPECT_EQ(rewind_input(), 1);
     EXPECT_EQ(rest(), "id:IN_B pdf:pdf id:IN_A rw:0 n:10:10 id:HIDDEN id:LAST eof");
     EXPECT_EQ(sg_closesources() + lex_free() + lex_free(), 0);
-    EXPECT_EQ(open_fds(), fds);
-}
-
-// Table outputs of each ending (complete, abandoned, failed at close and
-// abandoned), with and without freeing the tables in between.
-TEST(Lifecycle, TableOutputsLeaveNothingOpen) {
-    TempDir dir;
-    const std::string kept = dir.path() + "/kept.tbl", dropped = dir.path() + "/dropped.tbl";
-    const int fds = open_fds();
-    for (int round = 0; round < 6; ++round) {
-        uint32_t id = 0;
-        ASSERT_EQ(OpenOutput(kept.c_str(), round % 2 == 0 ? 0 : TPLEX_OUT_HEX_TEXT, 5), 0);
-        EXPECT_EQ(WriteReference(&id, 0) + StoreString("text"), 0);
-        EXPECT_EQ(DefineReferenceHere(nullptr, id, 1) + CloseOutput(), 0);
-        ASSERT_EQ(OpenOutput(dropped.c_str(), 0, 0), 0);
-        EXPECT_EQ(StoreString("gone") + AbandonOutput(round % 3 == 0), 0);
-        ASSERT_EQ(OpenOutput(dropped.c_str(), 0, 0), 0);
-        EXPECT_EQ(WriteReference(&id, 0), 0);  // never defined
-        EXPECT_EQ(CloseOutput(), TPLEX_OUT_UNDEFINED_REFERENCE);
-        EXPECT_EQ(AbandonOutput(0), 0);
-        EXPECT_FALSE(std::filesystem::exists(dropped));
-        EXPECT_EQ(StartMemoryOutput() + WriteUInt32(1) + FreeMemoryOutput(), 0);
-        EXPECT_EQ(round % 4 == 0 ? FreeOutputTables() : 0, 0);
-    }
-    EXPECT_TRUE(std::filesystem::exists(kept));
-    EXPECT_EQ(FreeOutputTables() + FreeOutputTables(), 0);
     EXPECT_EQ(open_fds(), fds);
 }
 

@@ -4,13 +4,14 @@
 
 #include <cstring>
 #include <string>
+#include <tuple>
 
 #include "base/token.h"
 #include "dict/dictionary.h"
-#include "lex_harness.h"
 #include "services/declarations.h"
 #include "services/file_names.h"
 #include "services/string_arg.h"
+#include "test_support.h"
 
 namespace tplex {
 namespace {
@@ -63,33 +64,25 @@ TEST(ParseIdent, UsesDeclarationsAndMismatches) {
     EXPECT_EQ(general_counter, 2);  // uses take no number
 }
 
+// Reading failures pass unchanged; other tokens are no identifier, or mismatch
+// (a character), or stand declared (a PDF string, a name of kind 25). With
+// declarations switched off (only 1 is on) parse_ident only reads.
 TEST(ParseIdent, TokensThatAreNoIdentifier) {
     LexSession s;
-    ASSERT_EQ(s.open("protocol 12 \"s\" + $ <\"p\"> 'c' 'd' #define D\nD D"), 1);
-    for (int i = 0; i < 4; ++i) EXPECT_EQ(ident(1, 13), err(TPLEX_IDENTIFIER_EXPECTED)) << i;
-    EXPECT_EQ(ident(1, 13), err(TPLEX_BAD_CHARACTER));     // reading failures pass unchanged
-    EXPECT_EQ(ident(1, 13), err(TPLEX_ALREADY_DECLARED));  // a PDF string: kind 33
-    EXPECT_EQ(ident(0, 13), err(TPLEX_TYPE_MISMATCH));     // a character: kind 34
-    EXPECT_EQ(ident(0, 34).substr(0, 5), "0 34:");
-    EXPECT_EQ(ident(1, 25), err(TPLEX_ALREADY_DECLARED));
-    EXPECT_EQ(ident(0, 25), "0 25:0");
-    EXPECT_EQ(ident(1, 13), err(TPLEX_IDENTIFIER_EXPECTED));  // end of input
-}
-
-TEST(ParseIdent, SwitchedOffOnlyReads) {
-    LexSession s;
-    ASSERT_EQ(s.open("foo protocol foo ghost x"), 1);
+    ASSERT_EQ(s.open("12 $ <\"p\"> 'c' #define D\nD D foo foo x"), 1);
+    const std::tuple<int, int, std::string> cases[] = {
+        // declare, class, result
+        {1, 13, err(TPLEX_IDENTIFIER_EXPECTED)}, {1, 13, err(TPLEX_BAD_CHARACTER)},
+        {1, 13, err(TPLEX_ALREADY_DECLARED)},    {0, 13, err(TPLEX_TYPE_MISMATCH)},
+        {1, 25, err(TPLEX_ALREADY_DECLARED)},    {0, 25, "0 25:0"}};
+    for (const auto &[declare, class_, result] : cases)
+        EXPECT_EQ(ident(std::uint8_t(declare), std::uint8_t(class_)), result);
     uint8_t *enabled = nullptr;
     sc_lex_setup(nullptr, nullptr, nullptr, nullptr, &enabled);
-    *enabled = 0;
+    *enabled = 2;
     EXPECT_EQ(parse_ident(1, 13), tk_new_identifier);
-    *enabled = 2;  // only 1 switches them on
-    EXPECT_EQ(parse_ident(1, 13), tk_reserved_word);
     *enabled = 1;
-    ASSERT_EQ(sc_next_token(), tk_new_identifier);
-    back_token();  // after back_token the identifier is declared all the same
     EXPECT_EQ(ident(1, 20), "0 20:2");
-    EXPECT_EQ(ident(1, 0), "0 0:3");  // an entry of kind 0: the scanner passes over the word
     EXPECT_EQ(rest(), "id:X eof");
 }
 
@@ -159,62 +152,38 @@ std::string split(std::string path, const char *ext) {
 }
 
 TEST(FileSpec, Split) {
+    // clang-format off
     const char *table[][3] = {
-        {"a\\b\\c.x", "x", "a\\b|c|x|c.x"},
-        {"a\\b\\c.x", "y", "a\\b|c.x||c.x"},
-        {"F.X", "x", "|F.X||F.X"},  // case-sensitive
-        {"c", "x", "|c||c"},        // an extension is never added
-        {".x", "x", "|.x||.x"},
-        {"a.b.c", "c", "|a.b|c|a.b.c"},
-        {"c.", "", "|c||c."},
-        {"\\c.x", "x", "|\\c|x|\\c.x"},
-        {"a/b\\c", "", "a/b|c||c"},
-        {"d\\", "x", "d|||"},
-        {"$", "x", "|$|x|$"},
-        {"d\\$", "x", "d|$||$"},
-        {"$", "0123456789abcdefghij", "|$|0123456789abcde|$"},
-    };
+        {"a\\b\\c.x", "x", "a\\b|c|x|c.x"}, {"a\\b\\c.x", "y", "a\\b|c.x||c.x"}, {"F.X", "x", "|F.X||F.X"},
+        {"c", "x", "|c||c"}, {"a.b.c", "c", "|a.b|c|a.b.c"}, {"c.", "", "|c||c."},
+        {"a/b\\c", "", "a/b|c||c"}, {"d\\$", "x", "d|$||$"},
+        {"$", "0123456789abcdefghij", "|$|0123456789abcde|$"}};
+    // clang-format on
     for (auto [path, ext, parts] : table) EXPECT_EQ(split(path, ext), parts) << path;
     EXPECT_EQ(split(std::string(300, 'd') + "\\n.x", "x"), std::string(199, 'd') + "|n|x|n.x");
-    EXPECT_EQ(split(std::string(100, 'n') + ".x", "x").substr(0, 81),
-              "|" + std::string(79, 'n') + "|");
 }
 
+// file_spec_invalid of dir, name and ext; a default name replaces only "$".
 TEST(FileSpec, DefaultNameAndValidity) {
     file_spec parts{};
     split_file_spec(std::string("d\\$").data(), "x", &parts);
     EXPECT_EQ(file_spec_invalid(&parts), 1);
     apply_default_name(&parts, "main");
-    apply_default_name(&parts, "other");  // only the marker is replaced
+    apply_default_name(&parts, "other");
     EXPECT_STREQ(parts.name_part, "main");
     EXPECT_EQ(file_spec_invalid(&parts), 0);
-    const char *table[][4] = {// dir, name, ext, invalid
-                              {"", "", "", "0"},
-                              {"d", "", "", "1"},
-                              {"", "", "x", "0"},
-                              {"a#b\\c/d~-:._ ", "n", "", "0"},
-                              {"", "n/a~-:_. 9Z", "e/~-:_. ", "0"},
-                              {"", "a#b", "", "1"},
-                              {"", "\\c", "", "1"},
-                              {"", "n", "e#", "1"},
-                              {"d$", "n", "", "1"},
-                              {"", "caf\xC3\xA9", "", "1"},
-                              {"", "n", "*", "1"}};
-    for (auto [dir, name, ext, invalid] : table) {
-        std::strcpy(parts.dir_part, dir), std::strcpy(parts.name_part, name),
-            std::strcpy(parts.ext_part, ext);
-        EXPECT_EQ(file_spec_invalid(&parts), *invalid - '0') << dir << "|" << name << "|" << ext;
-    }
-    const std::size_t lengths[][3] = {{100, 40, 10}, {101, 1, 0}, {0, 41, 0}, {0, 1, 11}};
-    for (auto [dir, name, ext] : lengths) {
+    const std::string d100(100, 'd'), n40(40, 'n'), e10(10, 'e');
+    // clang-format off
+    const std::string table[][4] = {  // dir, name, ext, invalid
+        {"", "", "", "0"}, {"d", "", "", "1"}, {"a#b\\c/d~-:._ ", "n/a~-:_. 9Z", "e/~-:_. ", "0"},
+        {"", "a#b", "", "1"}, {"", "n", "e#", "1"}, {"d$", "n", "", "1"}, {"", "caf\xC3\xA9", "", "1"},
+        {d100, n40, e10, "0"}, {d100 + "d", "n", "", "1"}, {"", n40 + "n", "", "1"}, {"", "n", e10 + "e", "1"}};
+    // clang-format on
+    for (const auto &[dir, name, ext, invalid] : table) {
         parts = file_spec{};
-        std::memset(parts.dir_part, 'd', dir), std::memset(parts.name_part, 'n', name);
-        std::memset(parts.ext_part, 'e', ext);
-        EXPECT_EQ(file_spec_invalid(&parts), dir > 100 || name > 40 || ext > 10)
-            << dir << name << ext;
+        dir.copy(parts.dir_part, 199), name.copy(parts.name_part, 79), ext.copy(parts.ext_part, 15);
+        EXPECT_EQ(file_spec_invalid(&parts), invalid[0] - '0') << dir << "|" << name << "|" << ext;
     }
-    std::memset(&parts, 'a', sizeof parts);  // unterminated
-    EXPECT_EQ(file_spec_invalid(&parts), 1);
 }
 
 }  // namespace

@@ -42,35 +42,16 @@ std::string lines_of(const std::string &bytes, std::size_t capacity = 3 * block)
 
 TEST(TextMode, Lines) {
     const std::string x(block - 1, 'x'), w(block - 2, 'w'), l(3 * block + 17, 'l');
+    // clang-format off
     const std::vector<std::pair<std::string, std::string>> cases = {
-        {"a\nb\n", "a\n|b\n"},
-        {"a\r\nb\r\n", "a\n|b\n"},
-        {"a\rb\n", "a\rb\n"},
-        {"a\r\r\n\r", "a\r\n|\r"},
-        {"last", "last"},
-        {"", ""},
-        {std::string("a\0b\n\0", 5), std::string("a\0b\n|\0", 6)},
-        {"a\x1A"
-         "b\n",
-         "a"},
-        {"\x1A"
-         "b\n",
-         ""},
-        {"a\n\x1A\nb\x1A", "a\n"},
-        {"a\r\x1A\n", "a\r"},
+        {"a\r\nb\r\n", "a\n|b\n"}, {"a\rb\n", "a\rb\n"}, {"a\r\r\n\r", "a\r\n|\r"}, {"last", "last"},
+        {"", ""}, {std::string("a\0b\n\0", 5), std::string("a\0b\n|\0", 6)}, {"a\x1Az\n", "a"},
+        {"\x1Az\n", ""}, {"a\n\x1A\nb\x1A", "a\n"}, {"a\r\x1A\n", "a\r"},
         // Across the end of the first block.
-        {x + "\r\ny\r\n", x + "\n|y\n"},
-        {x + "\rz\n", x + "\rz\n"},
-        {x + "\r", x + "\r"},
-        {x + "\r\x1A\n", x + "\r"},
-        {x + "\x1A"
-             "after",
-         x},
-        {x + "y\x1A"
-             "after",
-         x + "y"},
-        {x + "\r\n" + w + "\r\nend", x + "\n|" + w + "\n|end"},
-    };
+        {x + "\r\ny\r\n", x + "\n|y\n"}, {x + "\rz\n", x + "\rz\n"}, {x + "\r", x + "\r"},
+        {x + "\r\x1A\n", x + "\r"}, {x + "\x1Azz", x}, {x + "y\x1Azz", x + "y"},
+        {x + "\r\n" + w + "\r\nend", x + "\n|" + w + "\n|end"}};
+    // clang-format on
     for (const auto &[bytes, lines] : cases)
         EXPECT_EQ(lines_of(bytes), lines) << bytes.substr(0, 20);
     // At most capacity - 1 characters a line.
@@ -81,10 +62,21 @@ TEST(TextMode, Lines) {
               l.substr(0, 3 * block - 1) + "|" + l.substr(0, 18) + "\n|tail");
 }
 
+// Streams not opened here are read a byte at a time; a stream closed behind
+// the layer's back leaves no stale bytes; 24 read slots; paths with "\".
 TEST(TextMode, StreamsNotOpenedHereAndPaths) {
     test::TempDir tmp;
-#ifndef _WIN32
-    // On Windows text mode belongs to the C runtime and is chosen at opening.
+    char line[8] = "x";
+    EXPECT_FALSE(platform::read_line(nullptr, line, sizeof line));
+    EXPECT_STREQ(line, "x") << "a read that gets nothing leaves the line as it was";
+    EXPECT_EQ(platform::open_source(tmp.path.c_str()), nullptr);  // a directory
+    std::FILE *closed = platform::open_source(tmp.write("d/c.src", "first\nsecond\n").c_str());
+    EXPECT_TRUE(platform::read_line(closed, line, 3));
+    std::fclose(closed);
+    std::FILE *file = platform::open_source((tmp.path + "\\d\\c.src").c_str());
+    EXPECT_EQ(read_all(file, 100), "first\n|second\n");
+    EXPECT_EQ(platform::close_source(file), 0);
+#ifndef _WIN32  // on Windows text mode belongs to the C runtime, and so do the streams
     std::FILE *binary = std::fopen(tmp.write("b",
                                              "a\r\nb\rc\x1A"
                                              "d\n")
@@ -92,32 +84,13 @@ TEST(TextMode, StreamsNotOpenedHereAndPaths) {
                                    "rb");
     EXPECT_EQ(read_all(binary, 5000), "a\n|b\rc");
     std::fclose(binary);
-#endif
-    char line[8] = "x";
-    EXPECT_FALSE(platform::read_line(nullptr, line, sizeof line));
-    EXPECT_STREQ(line, "x") << "a read that gets nothing leaves the line as it was";
-    tmp.write("d/f.src", "f\n");
-    std::FILE *file = platform::open_source((tmp.path() + "\\d\\f.src").c_str());
-    EXPECT_EQ(read_all(file, 100), "f\n");
-    EXPECT_EQ(platform::close_source(file), 0);
-    EXPECT_EQ(platform::open_source(tmp.path().c_str()), nullptr);  // a directory
-#ifndef _WIN32
-    // The POSIX layer's own read slots: 24, and free again after a close.
     std::vector<std::FILE *> open;
-    const std::string path = tmp.path() + "/d/f.src";
-    while (std::FILE *f = platform::open_source(path.c_str())) open.push_back(f);
+    while (std::FILE *f = platform::open_source((tmp.path + "/b").c_str())) open.push_back(f);
     EXPECT_EQ(open.size(), 24u);
     EXPECT_EQ(platform::close_source(open.back()), 0);
-    EXPECT_NE(open.back() = platform::open_source(path.c_str()), nullptr);
+    EXPECT_NE(open.back() = platform::open_source((tmp.path + "/b").c_str()), nullptr);
     for (std::FILE *f : open) EXPECT_EQ(platform::close_source(f), 0);
 #endif
-    // A stream closed behind the layer's back: a new one at its address reads its own bytes.
-    std::FILE *closed = platform::open_source(tmp.write("c.src", "first\nsecond\n").c_str());
-    EXPECT_TRUE(platform::read_line(closed, line, 3));
-    std::fclose(closed);
-    file = platform::open_source(tmp.write("o.src", "other\n").c_str());
-    EXPECT_EQ(read_all(file, 100), "other\n");
-    EXPECT_EQ(platform::close_source(file), 0);
 }
 
 }  // namespace
