@@ -5,7 +5,6 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cstdio>
 #include <cstring>
 #include <string>
@@ -130,8 +129,6 @@ std::string listing(std::uint8_t all, const std::string &keys, int *next_key = n
 TEST(Listing, EntriesInSlotOrderWithPauses) {
     LexSession s;
     EXPECT_EQ(listing(0, ""), "\n End of Listing \n");
-    const std::string keywords = listing(1, "");
-    EXPECT_EQ(std::count(keywords.begin(), keywords.end(), '\n'), 123 + 12 + 2);  // 12 pauses
     dict_clear();
     int slot = 0;
     for (int kind : {2, 4, 9, 10, 12, 24, 25, 33, 34, 16})  // A, B, C... at slots 0, 64, 128...

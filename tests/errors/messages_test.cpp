@@ -42,7 +42,7 @@ TEST(Messages, CodesAndPositions) {
     test::LexSession s;
     ASSERT_EQ(s.open("one\r\ntwo\r\n"), 1);
     test::next(), test::next();
-    std::strcpy(source_stack[1].path, "main.src");
+    std::strcpy(source_stack[1].path, "main.src");  // the short name, not the temporary folder
     EXPECT_EQ(display(TPLEX_BAD_CHARACTER), at_main("Bad Character"));
     EXPECT_EQ(display(TPLEX_CLOSE_FAILED), heading + "Error Closing File\n");  // no position
     EXPECT_EQ(display(TPLEX_STATUS(0xD3470233u)), at_main("unspecified error: d3470233"));
