@@ -1,11 +1,8 @@
 #!/usr/bin/env bash
-# Runs the whole test suite: installs what it needs (Debian), then builds and
-# tests the library three times, once plainly, once under AddressSanitizer and
-# UndefinedBehaviorSanitizer, and once cross-built for Windows and run under
-# Wine (32-bit where the host runs 32-bit programs, else 64-bit: see
-# windows_build_and_test); warnings as errors. Then it runs each fuzz target (fuzz/run.sh)
-# for a minute, with clang. First of all, the sources must be formatted
-# (.clang-format) and clean under .clang-tidy.
+# The whole test suite: installs what it needs (Debian); checks format and
+# lint; builds and tests the library plainly, under AddressSanitizer and
+# UndefinedBehaviorSanitizer, and cross-built for Windows under Wine, warnings
+# as errors; then runs each fuzz target (fuzz/run.sh) for a minute.
 #
 #   tests/run.sh            everything
 #   tests/run.sh lint       only the format and lint checks
@@ -130,9 +127,7 @@ windows_build_and_test() {
     echo "== Windows checks that could not run: $skipped"
 }
 
-# The library's folders include one way only (tests/layers.sh); every C and
-# C++ source as .clang-format lays it out; the library and the tool clean
-# under .clang-tidy's checks.
+# One-way includes (tests/layers.sh), .clang-format's layout, .clang-tidy's checks.
 lint() {
     need_packages clang-format clang-tidy
     echo "== lint"

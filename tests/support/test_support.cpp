@@ -1,15 +1,14 @@
 #include "test_support.h"
 
-#include <fcntl.h>
-
-#include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <stdexcept>
+#include <random>
 #ifdef _WIN32
 #include <io.h>
-#include <sys/stat.h>
+#define dup _dup
+#define dup2 _dup2
+#define close _close
+#define fileno _fileno
 #else
 #include <unistd.h>
 #endif
@@ -18,117 +17,101 @@ namespace fs = std::filesystem;
 
 namespace tplex::test {
 
-namespace {
-
-#ifdef _WIN32
-// The C runtime's names for the POSIX descriptor calls.
-int dup(int fd) {
-    return _dup(fd);
+TempDir::TempDir() {
+    std::random_device random;
+    do path = (fs::temp_directory_path() / ("tplex-test-" + std::to_string(random()))).string();
+    while (!fs::create_directory(path));
 }
-int dup2(int from, int to) {
-    return _dup2(from, to);
-}
-int close(int fd) {
-    return _close(fd);
-}
-
-// _mktemp_s picks a name that does not exist yet; creating it can still
-// lose a race with another process, so try again a few times.
-std::string make_temp_dir(const std::string &pattern) {
-    for (int attempt = 0; attempt < 100; ++attempt) {
-        std::string name = pattern;
-        if (_mktemp_s(name.data(), name.size() + 1) != 0) break;
-        std::error_code ec;
-        if (fs::create_directory(name, ec)) return name;
-    }
-    throw std::runtime_error("cannot create a temporary folder");
-}
-
-// Binary mode: captured text is what the library wrote, without the CR
-// that text mode would put before each line feed on the console.
-int make_temp_file(std::string &name) {
-    for (int attempt = 0; attempt < 100; ++attempt) {
-        std::string candidate = name;
-        if (_mktemp_s(candidate.data(), candidate.size() + 1) != 0) break;
-        int fd = _open(candidate.c_str(), _O_CREAT | _O_EXCL | _O_RDWR | _O_BINARY,
-                       _S_IREAD | _S_IWRITE);
-        if (fd >= 0) {
-            name = candidate;
-            return fd;
-        }
-    }
-    return -1;
-}
-#else
-std::string make_temp_dir(std::string pattern) {
-    if (mkdtemp(pattern.data()) == nullptr) throw std::runtime_error("mkdtemp failed");
-    return pattern;
-}
-
-int make_temp_file(std::string &name) {
-    return mkstemp(name.data());
-}
-#endif
-
-}  // namespace
-
-TempDir::TempDir()
-    : path_(make_temp_dir((fs::temp_directory_path() / "tplex-test-XXXXXX").string())) {}
 
 TempDir::~TempDir() {
     std::error_code ec;
-    fs::remove_all(path_, ec);
+    fs::remove_all(path, ec);
 }
 
 std::string TempDir::write(const std::string &name, const std::string &bytes) const {
-    fs::path full = fs::path(path_) / name;
+    const fs::path full = fs::path(path) / name;
     fs::create_directories(full.parent_path());
-    std::ofstream out(full, std::ios::binary);
-    out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
+    std::ofstream(full, std::ios::binary).write(bytes.data(), std::streamsize(bytes.size()));
     return full.string();
 }
 
-std::string TempDir::mkdir(const std::string &name) const {
-    fs::path full = fs::path(path_) / name;
-    fs::create_directories(full);
-    return full.string();
+// A binary temporary file: the captured text is what was written, without
+// the CRs of text mode.
+Capture::Capture(int fd) : fd_(fd), saved_(dup(fd)), file_(std::tmpfile()) {
+    std::fflush(fd == 1 ? stdout : stderr);
+    dup2(fileno(file_), fd);
 }
 
-CaptureStdout::CaptureStdout() {
-    std::fflush(stdout);
-    file_ = (fs::temp_directory_path() / "tplex-stdout-XXXXXX").string();
-    int fd = make_temp_file(file_);
-    if (fd < 0) throw std::runtime_error("cannot create a capture file");
-    saved_fd_ = dup(1);
-    dup2(fd, 1);
-    close(fd);
-}
-
-CaptureStdout::~CaptureStdout() {
-    text();
-}
-
-std::string CaptureStdout::text() {
-    if (!done_) {
-        std::fflush(stdout);
-        dup2(saved_fd_, 1);
-        close(saved_fd_);
-        std::ifstream in(file_, std::ios::binary);
-        captured_.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-        in.close();
-        std::remove(file_.c_str());
-        done_ = true;
-    }
+std::string Capture::text() {
+    if (file_ == nullptr) return captured_;
+    std::fflush(fd_ == 1 ? stdout : stderr);
+    dup2(saved_, fd_), close(saved_), std::rewind(file_);
+    for (int c; (c = std::fgetc(file_)) != EOF;) captured_ += static_cast<char>(c);
+    std::fclose(file_), file_ = nullptr;
     return captured_;
 }
 
-ChangeDir::ChangeDir(const std::string &dir) : saved_(fs::current_path().string()) {
+ChangeDir::ChangeDir(const std::string &dir) : saved(fs::current_path().string()) {
     fs::current_path(dir);
 }
 
 ChangeDir::~ChangeDir() {
     std::error_code ec;
-    fs::current_path(saved_, ec);
+    fs::current_path(saved, ec);
+}
+
+std::string err(status_code code) {
+    char buf[32];
+    std::snprintf(buf, sizeof buf, "err:%08x", static_cast<unsigned>(code));
+    return buf;
+}
+
+std::string describe(status_code result) {
+    if (result < 0) return err(result);
+    token_record *t = nullptr;
+    sc_lex_setup(&t, nullptr, nullptr, nullptr, nullptr);
+    const std::string v = std::to_string(t->value), text = t->text;
+    switch (t->kind) {
+        case tk_number:
+            return "n:" + v + ":" + text;
+        case tk_operator:
+            return "op:" + v;
+        case tk_end_of_input:
+            return "eof";
+        case tk_reserved_word:
+            return "rw:" + v;
+        case tk_hash_definition:
+            return "def:" + text + ":" + v;
+    }
+    const char *prefix = t->kind == tk_string           ? "s:"
+                         : t->kind == tk_new_identifier ? "id:"
+                         : t->kind == tk_pdf_string     ? "pdf:"
+                         : t->kind == tk_char           ? "ch:"
+                                                        : nullptr;
+    return prefix ? prefix + text : "k" + std::to_string(t->kind) + ":" + v + ":" + text;
+}
+
+std::string next() {
+    return describe(sc_next_token());
+}
+
+std::string rest() {
+    std::string out;
+    for (int i = 0; i < 20000; ++i) {
+        const status_code r = sc_next_token();
+        out += (out.empty() ? "" : " ") + describe(r);
+        if (r == tk_end_of_input) break;
+    }
+    return out;
+}
+
+std::string lex(const std::string &text, std::vector<std::string> defines) {
+    LexSession s;
+    std::vector<char *> names;
+    for (std::string &n : defines) names.push_back(n.data());
+    const status_code r = sc_lex_init_defines(names.data(), static_cast<int32_t>(names.size()));
+    if (r != 0) return "defines: " + err(r);
+    return s.open(text) == 1 ? rest() : "open failed";
 }
 
 }  // namespace tplex::test

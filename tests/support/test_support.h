@@ -1,68 +1,73 @@
-// Helpers shared by the test programs.
+// Helpers shared by the test programs: temporary folders, captured output,
+// and a lexing session with tokens in a short form, joined by blanks:
+//   n:VALUE:TEXT number   s:TEXT string    op:VALUE operator  rw:VALUE reserved word
+//   id:TEXT identifier    pdf:TEXT PDF     ch:TEXT character  def:TEXT:VALUE kind 25
+//   eof  end of input     kKIND:VALUE:TEXT any other kind     err:xxxxxxxx a failure
 #ifndef TPLEX_TESTS_SUPPORT_H
 #define TPLEX_TESTS_SUPPORT_H
 
+#include <cstdio>
 #include <string>
+#include <vector>
+
+#include "tplex/lexer.h"
 
 namespace tplex::test {
 
-// The line break that the host's text mode writes ("w" and "w+"): CR LF on
-// Windows, LF on a POSIX host. Reading in text mode gives LF on both.
+// The line break that the host's text mode writes: CR LF on Windows.
 #ifdef _WIN32
 inline constexpr const char host_line_end[] = "\r\n";
 #else
 inline constexpr const char host_line_end[] = "\n";
 #endif
 
-// A fresh folder under the system's temporary directory, removed with
-// everything in it when the object goes.
-class TempDir {
-public:
+// A fresh temporary folder, removed with its contents when the object goes.
+struct TempDir {
     TempDir();
     ~TempDir();
-    TempDir(const TempDir &) = delete;
-    TempDir &operator=(const TempDir &) = delete;
-
-    const std::string &path() const { return path_; }
-    // Writes a file (bytes exactly as given) below the folder and returns
-    // its full path. Folders on the way are created.
+    // Writes a file (bytes as given, folders on the way created); its full path.
     std::string write(const std::string &name, const std::string &bytes) const;
-    // Creates a sub-folder and returns its full path.
-    std::string mkdir(const std::string &name) const;
-
-private:
-    std::string path_;
+    std::string path;
 };
 
-// Captures everything written to standard output (stdout's stream and file
-// descriptor 1) between construction and text().
-class CaptureStdout {
+// Captures what is written to file descriptor 1 or 2 (and its stream) until text().
+class Capture {
 public:
-    CaptureStdout();
-    ~CaptureStdout();
-    CaptureStdout(const CaptureStdout &) = delete;
-    CaptureStdout &operator=(const CaptureStdout &) = delete;
-    // Stops capturing (if still on) and returns what was written.
+    explicit Capture(int fd = 1);
+    ~Capture() { text(); }
     std::string text();
 
 private:
-    int saved_fd_ = -1;
-    std::string file_;
-    bool done_ = false;
+    int fd_, saved_;
+    std::FILE *file_;
     std::string captured_;
 };
 
 // Changes the working directory for the object's lifetime.
-class ChangeDir {
-public:
+struct ChangeDir {
     explicit ChangeDir(const std::string &dir);
     ~ChangeDir();
-    ChangeDir(const ChangeDir &) = delete;
-    ChangeDir &operator=(const ChangeDir &) = delete;
-
-private:
-    std::string saved_;
+    std::string saved;
 };
+
+std::string err(status_code code);         // "err:d3470218"
+std::string describe(status_code result);  // a call's result and the token record
+std::string next();                        // one sc_next_token, described
+std::string rest();  // sc_next_token up to the end of input (at most 20000 calls)
+
+// sc_lex_init on construction; sg_closesources and lex_free on destruction.
+struct LexSession {
+    LexSession() { sc_lex_init(); }
+    ~LexSession() { sg_closesources(), lex_free(); }
+    // Writes main.src and opens it with sc_lex_init_file.
+    status_code open(const std::string &bytes) const {
+        return sc_lex_init_file(dir.write("main.src", bytes).c_str());
+    }
+    TempDir dir;
+};
+
+// A text lexed from a fresh file in a fresh session, names predefined first.
+std::string lex(const std::string &text, std::vector<std::string> defines = {});
 
 }  // namespace tplex::test
 

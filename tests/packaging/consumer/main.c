@@ -1,8 +1,7 @@
 /* Lexes one file with the installed library and prints its token count.
  * Linked with the static archive (TPLEX_STATIC), it also uses what only the
- * archive carries: the parser services, with which it lexes the file a
- * second time, found through an include directory, and the table output
- * module. */
+ * archive carries: the parser services, with which it lexes the file again,
+ * found through an include directory, and the table output module. */
 #include <stdio.h>
 #include <string.h>
 #include <tplex/lexer.h>
@@ -19,35 +18,22 @@ static int count_tokens(const char *dir, const char *name) {
     if (sc_lex_init() != 0) return -1;
 #ifdef TPLEX_STATIC
     if (dir != NULL && add_include_dir(dir) != 0) return -1;
-#else
-    (void)dir;
 #endif
     if (sc_lex_init_file(name) < 0) return -1;
     while ((r = sc_next_token()) >= 0 && r != tk_end_of_input) ++tokens;
-    if (r < 0) sg_DisplayError(r);
     sg_closesources();
     lex_free();
     return r < 0 ? -1 : tokens;
 }
 
 int main(int argc, char **argv) {
-    int tokens;
-    if (argc != 2) {
-        fprintf(stderr, "usage: consumer FILE\n");
-        return 2;
-    }
-    tokens = count_tokens(NULL, argv[1]);
+    int tokens = argc == 2 ? count_tokens(NULL, argv[1]) : -1;
 #ifdef TPLEX_STATIC
-    {
-        /* The file's own name, searched for in its folder: the same tokens. */
-        char dir[TPLEX_PATH_SIZE];
-        const char *slash = strrchr(argv[1], '/');
-        if (slash == NULL || (size_t)(slash - argv[1]) >= sizeof dir) return 1;
-        memcpy(dir, argv[1], (size_t)(slash - argv[1]));
-        dir[slash - argv[1]] = '\0';
-        if (count_tokens(dir, slash + 1) != tokens) return 1;
-    }
-    if (FreeOutputTables() != 0) return 1;
+    char dir[TPLEX_PATH_SIZE] = "";
+    const char *slash = argc == 2 ? strrchr(argv[1], '/') : NULL;
+    if (slash == NULL || (size_t)(slash - argv[1]) >= sizeof dir) return 1;
+    memcpy(dir, argv[1], (size_t)(slash - argv[1]));
+    if (count_tokens(dir, slash + 1) != tokens || FreeOutputTables() != 0) return 1;
 #endif
     printf("tplex %s: %d tokens\n", TPLEX_VERSION_STRING, tokens);
     return tokens < 0 ? 1 : 0;
