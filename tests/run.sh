@@ -127,11 +127,14 @@ windows_build_and_test() {
     echo "== Windows checks that could not run: $skipped"
 }
 
-# One-way includes (tests/layers.sh), .clang-format's layout, .clang-tidy's checks.
+# One-way includes (tests/layers.sh), README's word tables as the library
+# holds them (tests/readme_words.sh), .clang-format's layout, .clang-tidy's
+# checks.
 lint() {
     need_packages clang-format clang-tidy
     echo "== lint"
     bash "$root/tests/layers.sh" "$root"
+    bash "$root/tests/readme_words.sh"
     local layers  # the library's folders, as CMakeLists.txt lists them
     read -r -a layers <<<"$(sed -n 's/^set(TPLEX_LAYERS \(.*\))$/\1/p' "$root/CMakeLists.txt")"
     local sources=("${layers[@]}" tools tests fuzz include bench)
