@@ -190,11 +190,11 @@ status_code make_label(uint16_t number, int16_t code, uint8_t mode);
 status_code parse_string(char *out, uint8_t mode);
 
 /* ------------------------------------------------------------------------ */
-/* File specifications                                                      */
+/* File names                                                               */
 /* ------------------------------------------------------------------------ */
 
-/* A file specification taken apart. "$" as the name is a marker for a
- * default name (apply_default_name). */
+/* A file name taken apart into directory, name and extension. "$" as the
+ * name is a marker for a default name (apply_default_name). */
 typedef struct file_spec {
     char dir_part[200]; /* before the last separator; empty if none */
     char name_part[80]; /* the name, without an extension split off */
@@ -210,7 +210,7 @@ void split_file_spec(char *path, const char *expected_ext, file_spec *out);
 /* Puts name in place of a name_part that is exactly "$"; otherwise, or with
  * a null name, changes nothing. */
 void apply_default_name(file_spec *parts, const char *name);
-/* 1 when the specification is invalid: a directory of more than 100, a name
+/* 1 when the parts do not make a valid file name: a directory of more than 100, a name
  * of more than 40 or an extension of more than 10 characters (or a field
  * without its NUL), a directory without a name, or a character not allowed
  * where it stands (the "$" marker included); 0 when it is valid. */

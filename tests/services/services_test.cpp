@@ -147,7 +147,7 @@ std::string split(std::string path, const char *ext) {
            path.c_str();
 }
 
-TEST(FileSpec, Split) {
+TEST(FileNameParts, Split) {
     // clang-format off
     const char *table[][3] = {
         {"a\\b\\c.x", "x", "a\\b|c|x|c.x"}, {"a\\b\\c.x", "y", "a\\b|c.x||c.x"}, {"F.X", "x", "|F.X||F.X"},
@@ -160,7 +160,7 @@ TEST(FileSpec, Split) {
 }
 
 // file_spec_invalid of dir, name and ext; a default name replaces only "$".
-TEST(FileSpec, DefaultNameAndValidity) {
+TEST(FileNameParts, DefaultNameAndValidity) {
     file_spec parts{};
     split_file_spec(std::string("d\\$").data(), "x", &parts);
     EXPECT_EQ(file_spec_invalid(&parts), 1);
