@@ -12,7 +12,8 @@
 # TPLEX_FUZZ_JOBS (targets at a time, default 2).
 # Findings are written to <build>/findings/<target>/; the corpus a run grows
 # stays in <build>/corpus/<target>/ and seeds the next run. A finding that
-# is fixed belongs in tests/robustness/crashes/<target>/ as a regression test.
+# is fixed belongs in fuzz/regressions/<target>/, replayed by the
+# test suite (fuzz/replay).
 set -euo pipefail
 cd "$(dirname "$0")/.."
 root=$(pwd)

@@ -1,5 +1,5 @@
 // Replays through the fuzz harnesses the inputs that once made a target fail
-// (tests/robustness/crashes/<target>/, kept after the fix) and the seed
+// (fuzz/regressions/<target>/, kept after the fix) and the seed
 // corpora (fuzz/corpus/<target>/). A harness aborts on any broken invariant;
 // the sanitizer build adds memory errors and leaks.
 #include <gtest/gtest.h>
@@ -18,7 +18,7 @@ namespace {
 
 void replay(const std::string &target, void (*harness)(const std::uint8_t *, std::size_t)) {
     int inputs = 0;
-    for (const char *dir : {"tests/robustness/crashes/", "fuzz/corpus/"}) {
+    for (const char *dir : {"fuzz/regressions/", "fuzz/corpus/"}) {
         std::error_code ec;
         for (const auto &e :
              std::filesystem::directory_iterator(TPLEX_SOURCE_DIR "/" + (dir + target), ec)) {
