@@ -1,17 +1,13 @@
 #!/usr/bin/env bash
-# The whole test suite: installs what it needs (Debian); checks format and
-# lint; builds and tests the library plainly, under AddressSanitizer and
-# UndefinedBehaviorSanitizer, and cross-built for Windows under Wine, warnings
-# as errors; then runs each fuzz target (fuzz/run.sh) for a minute.
+# The whole test suite, warnings as errors; installs what it needs (Debian).
 #
-#   tests/run.sh            everything
-#   tests/run.sh lint       only the format and lint checks
-#   tests/run.sh plain      only the plain build
-#   tests/run.sh sanitize   only the sanitizer build
-#   tests/run.sh windows    only the Windows builds (tplex.dll, under Wine);
-#                           TPLEX_NO_32BIT=1 takes the 64-bit path on any host
-#   tests/run.sh fuzz       only the fuzz targets, each for TPLEX_FUZZ_SECONDS
-#                           (default 60) with clang, failing on any finding
+#   tests/run.sh [all]      every step below, in this order
+#   tests/run.sh lint       layers, README's word tables, clang-format, clang-tidy
+#   tests/run.sh plain      the plain build and its tests
+#   tests/run.sh sanitize   the same under AddressSanitizer and UndefinedBehaviorSanitizer
+#   tests/run.sh windows    the Windows builds under Wine (TPLEX_NO_32BIT=1 takes
+#                           the 64-bit path on any host)
+#   tests/run.sh fuzz       each fuzz target for TPLEX_FUZZ_SECONDS (default 60)
 set -euo pipefail
 cd "$(dirname "$0")/.."
 root=$(pwd)
@@ -30,15 +26,15 @@ need_packages() {
     DEBIAN_FRONTEND=noninteractive $sudo apt-get install -y -qq --no-install-recommends "${missing[@]}"
 }
 
-build_and_test() {  # name, extra cmake options...
-    local name=$1; shift
-    local dir="$root/build-tests/$name"
+build_and_test() {  # name, extra cmake options...; only_test=NAME runs that test alone
+    local name=$1 dir="$root/build-tests/$1"
+    shift
     echo "== $name build"
     cmake -S "$root" -B "$dir" -DCMAKE_BUILD_TYPE=RelWithDebInfo -DTPLEX_BUILD_TESTS=ON \
         -DTPLEX_WERROR=ON -DTPLEX_ALLOC_HOOK=ON "$@" >/dev/null
     cmake --build "$dir" -j "$jobs"
-    echo "== $name tests"
-    (cd "$dir" && ctest --output-on-failure -j "$jobs")
+    echo "== $name tests${only_test:+: $only_test only}"
+    (cd "$dir" && ctest --output-on-failure -j "$jobs" ${only_test:+-R "^$only_test\$"})
 }
 
 # Whether this host runs 32-bit x86 programs: a three-instruction program
@@ -108,14 +104,8 @@ windows_build_and_test() {
         echo "   the i686 DLL is built and checked without running, and every Windows test"
         echo "   runs in a 64-bit build under 64-bit Wine"
         need_packages g++-mingw-w64-i686 g++-mingw-w64-x86-64 googletest wine64
-        echo "== windows32 build (nothing of it runs here)"
-        local dir="$root/build-tests/windows32"
-        cmake -S "$root" -B "$dir" -DCMAKE_BUILD_TYPE=RelWithDebInfo -DTPLEX_BUILD_TESTS=ON \
-            -DTPLEX_WERROR=ON -DTPLEX_ALLOC_HOOK=ON \
-            -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64-i686.cmake" >/dev/null
-        cmake --build "$dir" -j "$jobs"
-        echo "== windows32 tests: the export table only"
-        (cd "$dir" && ctest --output-on-failure -R '^windows_dll_interface$')
+        only_test=windows_dll_interface build_and_test windows32 \
+            -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64-i686.cmake"
         export WINEPREFIX=${TPLEX_WINEPREFIX64:-/tmp/tplex-wine64-$(id -u)} WINEARCH=win64
         export WINELOADER=/usr/lib/wine/wine64 WINESERVER=/usr/lib/wine/wineserver64
         wine_build_and_test windows64 "$WINELOADER" "$WINESERVER" \
