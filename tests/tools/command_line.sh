@@ -1,12 +1,14 @@
 #!/usr/bin/env bash
-# The tool's command line: exit status 0 (clean), 1 (the input had
-# failures), 2 (usage or I/O error), and the messages that go with them.
-#
-#   command_line.sh TOOL VERSION      (run in examples/)
+# The tool's command line: exit status 0 (clean), 1 (the input had failures),
+# 2 (usage or I/O error), its messages, and whole outputs equal to the files
+# in expected/ (TPLEX_UPDATE_EXPECTED=1 rewrites them).
+#   command_line.sh TOOL VERSION TABLES_DIR      (run in examples/)
 set -u
-tool=$1 version=$2
+tool=$1 version=$2 tables=$3 here=$(cd "$(dirname "$0")" && pwd)
 failed=0
 windows=$([ "${TPLEX_TARGET_SYSTEM:-}" = Windows ] && echo 1)
+tmp=$(mktemp -d)
+trap 'rm -rf "$tmp"' EXIT
 
 # expect STATUS PATTERN ARGS...: tplex ARGS exits with STATUS and prints a
 # line matching the extended regular expression PATTERN (either stream);
@@ -22,6 +24,19 @@ expect() {
             "${*:3}" "$rc" "$1" "${COUNT:-1+}" "$2" "$(head -n 20 <<<"$out")"
     fi
 }
+
+# same NAME STATUS ARGS...: tplex ARGS exits with STATUS and prints expected/NAME.
+same() {
+    "$tool" "${@:3}" </dev/null >"$tmp/out"
+    local rc=$?
+    [ "${TPLEX_UPDATE_EXPECTED:-0}" = 1 ] && cp "$tmp/out" "$here/expected/$1"
+    if [ "$rc" != "$2" ] || ! diff -u "$here/expected/$1" "$tmp/out"; then
+        failed=$((failed + 1)) && echo "FAILED: tplex ${*:3} -> status $rc, wanted $2 and expected/$1"
+    fi
+}
+
+same check_failures_3.txt 1 check --max-failures=3 failures.tpl
+same dict_signalling.txt 0 dict -I include signalling.tpl
 
 expect 0 "^tplex $version\$" --version
 expect 0 '^usage: tplex tokens' help
@@ -47,22 +62,16 @@ else
     expect 2 "^tplex: cannot open /nowhere/x.tpl: not found $cannot_open" check /nowhere/x.tpl
 fi
 expect 2 '^tplex: -D x: the name is already known' check -D X -D x signalling.tpl
-nine="-I a -I b -I c -I d -I e -I f -I g -I h -I include"
-# shellcheck disable=SC2086
-expect 2 '^tplex: -I include: Attempting too many Includes$' check -I i $nine signalling.tpl
+nine=(-I a -I b -I c -I d -I e -I f -I g -I h -I include)
+expect 2 '^tplex: -I include: Attempting too many Includes$' check -I i "${nine[@]}" signalling.tpl
 expect 1 '^tplex table: signalling.tpl: ' table signalling.tpl
 
 # Accepted forms; failures past --max-failures are counted, not printed.
 expect 0 '^signalling.tpl: 0 failures$' check -Iinclude -DTRACE -- signalling.tpl
-# shellcheck disable=SC2086
-expect 0 '^signalling.tpl: 0 failures$' check $nine signalling.tpl
-expect 1 '^No Includes to Search for Included File$' check signalling.tpl
-expect 1 '^failures.tpl: 17 failures$' check --max-failures=3 failures.tpl
+expect 0 '^signalling.tpl: 0 failures$' check "${nine[@]}" signalling.tpl
 expect 1 '^tplex: 1 more failure not shown \(--max-failures 16\)$' tokens --max-failures 16 failures.tpl
 
 # Sources of the tool's own making, in a folder of their own.
-tmp=$(mktemp -d)
-trap 'rm -rf "$tmp"' EXIT
 cd "$tmp" || exit 2
 mkdir inc
 head -c 150 /dev/zero | tr '\0' '$' >dollars.tpl
@@ -89,14 +98,18 @@ if [ -w /dev/full ] && [ ! "$windows" ]; then
 fi
 cd "$OLDPWD" || exit 2
 
-# The listing's key-press pause does not wait on an input that is not a
-# terminal, even one that stays open.
+# The listing's key-press pause does not wait on an open input that is not a terminal.
 exec 3< <(sleep 30)
 sleeper=$!
-if ! timeout 20 "$tool" dict --all -I include signalling.tpl <&3 2>&1 | grep -q '^ End of Listing $'; then
-    failed=$((failed + 1)) && echo "FAILED: tplex dict --all waited on an open pipe (or failed)"
-fi
-exec 3<&-
-kill "$sleeper"
+timeout 20 "$tool" dict --all -I include signalling.tpl <&3 2>&1 | grep -q '^ End of Listing $' ||
+    { failed=$((failed + 1)) && echo "FAILED: tplex dict --all waited on an open pipe (or failed)"; }
+exec 3<&- && kill "$sleeper"
+
+# The token stream of a short file, and the summary of a table file.
+cd "$here" || exit 2
+same tokens.txt 1 tokens tokens.tpl
+same tokens.json 1 tokens --json tokens.tpl
+cd "$tables" || exit 2
+same table_sound.txt 0 table sound.tbl
 echo "$failed failed"
 [ "$failed" = 0 ]
