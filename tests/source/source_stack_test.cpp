@@ -93,7 +93,9 @@ TEST_F(SourceStack, SearchesIncludeDirectoriesInOrder) {
     expect_opened("dir.src", "lib\\dir.src");
     expect_refused("cwd.src", TPLEX_CANNOT_OPEN_SOURCE);  // the current directory is not searched
     dirs({"lib\\", "."});
-    expect_opened("cwd.src", ".\\cwd.src");  // one backslash always
+    expect_opened("cwd.src", ".\\cwd.src");            // one backslash always
+    EXPECT_EQ(rewind_input() + include_dir_count, 1);  // the main file again, as it was found
+    EXPECT_EQ(test::next(), "id:LIB");
 }
 
 TEST_F(SourceStack, LimitsAndClosing) {
