@@ -71,9 +71,7 @@ protected:
 };
 
 TEST_F(SourceStack, OpensWithoutIncludeDirectories) {
-    write("main.src");
-    write("sub/inc.src");
-    write(std::string(200, 'r'));
+    write("main.src"), write("sub/inc.src"), write(std::string(200, 'r'));
     const std::string abs = s_.dir.path + "/main.src";
     expect_opened("main.src", "main.src");
     expect_opened("sub\\inc.src", "sub\\inc.src", "sub/inc.src\n");  // opened with "/"
@@ -114,6 +112,7 @@ TEST_F(SourceStack, LimitsAndClosing) {
     EXPECT_EQ(add_include_dir(std::string(255, 'x').c_str()), TPLEX_BAD_DIRECTORY_NAME);
     EXPECT_EQ(add_include_dir(nullptr), TPLEX_BAD_DIRECTORY_NAME);
     EXPECT_EQ(include_dir_count + open_source_file(nullptr), TPLEX_NULL_FILENAME);
+    EXPECT_EQ(test::lex(std::string(4998, ' ') + "ab\n"), "id:A id:B eof");  // split at 4999
 }
 
 }  // namespace
