@@ -37,20 +37,21 @@ protected:
         for (const char *d : list) ASSERT_EQ(add_include_dir(d), TPLEX_OK) << d;
     }
     // A refused open leaves every frame as it was, except that the next one
-    // is left at position 0, with no line and no file.
+    // (made to look used) is left at position 0, with no line and no file.
     void expect_refused(const std::string &name, status_code code) {
         const int16_t depth = source_depth;
         source_frame *failed = depth < max_source_depth ? &source_stack[depth + 1] : nullptr;
-        if (failed != nullptr) failed->read_pos = 7, failed->line_no = 3;  // an earlier file's
+        if (failed != nullptr) failed->read_pos = 7, failed->line_no = 3, failed->file = stderr;
         const std::string before(reinterpret_cast<char *>(source_stack),
                                  sizeof(source_frame) * source_frame_count);
         EXPECT_EQ(open_source_file(name.c_str()), code) << name;
         EXPECT_EQ(source_depth, depth);
         if (failed != nullptr && code != TPLEX_TOO_MANY_INCLUDE_LEVELS) {
             EXPECT_EQ(failed->read_pos + failed->line_no + 1 + !!failed->file, 0u) << name;
-            failed->read_pos = 7, failed->line_no = 3;
+            failed->read_pos = 7, failed->line_no = 3, failed->file = stderr;
         }
         EXPECT_EQ(std::memcmp(before.data(), source_stack, before.size()), 0) << name;
+        if (failed != nullptr) failed->file = nullptr;  // not to be closed
     }
     // An open as the next depth: the path it was opened under, no line yet,
     // and the file's first line (when given) read from its stream.
