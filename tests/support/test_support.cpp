@@ -1,6 +1,5 @@
 #include "test_support.h"
 
-#include <filesystem>
 #include <fstream>
 #include <random>
 #ifdef _WIN32
@@ -23,11 +22,6 @@ TempDir::TempDir() {
     while (!fs::create_directory(path));
 }
 
-TempDir::~TempDir() {
-    std::error_code ec;
-    fs::remove_all(path, ec);
-}
-
 std::string TempDir::write(const std::string &name, const std::string &bytes) const {
     const fs::path full = fs::path(path) / name;
     fs::create_directories(full.parent_path());
@@ -35,8 +29,7 @@ std::string TempDir::write(const std::string &name, const std::string &bytes) co
     return full.string();
 }
 
-// A binary temporary file: the captured text is what was written, without
-// the CRs of text mode.
+// Into a binary temporary file: the text as written, without text mode's CRs.
 Capture::Capture(int fd) : fd_(fd), saved_(dup(fd)), file_(std::tmpfile()) {
     std::fflush(fd == 1 ? stdout : stderr);
     dup2(fileno(file_), fd);
@@ -51,15 +44,6 @@ std::string Capture::text() {
     return captured_;
 }
 
-ChangeDir::ChangeDir(const std::string &dir) : saved(fs::current_path().string()) {
-    fs::current_path(dir);
-}
-
-ChangeDir::~ChangeDir() {
-    std::error_code ec;
-    fs::current_path(saved, ec);
-}
-
 std::string err(status_code code) {
     char buf[32];
     std::snprintf(buf, sizeof buf, "err:%08x", static_cast<unsigned>(code));
@@ -71,37 +55,24 @@ std::string describe(status_code result) {
     token_record *t = nullptr;
     sc_lex_setup(&t, nullptr, nullptr, nullptr, nullptr);
     const std::string v = std::to_string(t->value), text = t->text;
-    switch (t->kind) {
-        case tk_number:
-            return "n:" + v + ":" + text;
-        case tk_operator:
-            return "op:" + v;
-        case tk_end_of_input:
-            return "eof";
-        case tk_reserved_word:
-            return "rw:" + v;
-        case tk_hash_definition:
-            return "def:" + text + ":" + v;
-    }
-    const char *prefix = t->kind == tk_string           ? "s:"
-                         : t->kind == tk_new_identifier ? "id:"
-                         : t->kind == tk_pdf_string     ? "pdf:"
-                         : t->kind == tk_char           ? "ch:"
-                                                        : nullptr;
-    return prefix ? prefix + text : "k" + std::to_string(t->kind) + ":" + v + ":" + text;
-}
-
-std::string next() {
-    return describe(sc_next_token());
+    switch (t->kind) {  // clang-format off
+        case tk_number: return "n:" + v + ":" + text;
+        case tk_operator: return "op:" + v;
+        case tk_end_of_input: return "eof";
+        case tk_reserved_word: return "rw:" + v;
+        case tk_hash_definition: return "def:" + text + ":" + v;
+        case tk_string: return "s:" + text;
+        case tk_new_identifier: return "id:" + text;
+        case tk_pdf_string: return "pdf:" + text;
+        case tk_char: return "ch:" + text;
+        default: return "k" + std::to_string(t->kind) + ":" + v + ":" + text;
+    }  // clang-format on
 }
 
 std::string rest() {
     std::string out;
-    for (int i = 0; i < 20000; ++i) {
-        const status_code r = sc_next_token();
-        out += (out.empty() ? "" : " ") + describe(r);
-        if (r == tk_end_of_input) break;
-    }
+    for (status_code r = 0, calls = 0; r != tk_end_of_input && calls < 20000; ++calls)
+        out += (out.empty() ? "" : " ") + describe(r = sc_next_token());
     return out;
 }
 

@@ -7,6 +7,7 @@
 #define TPLEX_TESTS_SUPPORT_H
 
 #include <cstdio>
+#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -20,11 +21,12 @@ inline constexpr const char host_line_end[] = "\r\n";
 #else
 inline constexpr const char host_line_end[] = "\n";
 #endif
+inline std::error_code ignored;  // failures in destructors, which must not throw
 
 // A fresh temporary folder, removed with its contents when the object goes.
 struct TempDir {
     TempDir();
-    ~TempDir();
+    ~TempDir() { std::filesystem::remove_all(path, ignored); }
     // Writes a file (bytes as given, folders on the way created); its full path.
     std::string write(const std::string &name, const std::string &bytes) const;
     std::string path;
@@ -45,22 +47,23 @@ private:
 
 // Changes the working directory for the object's lifetime.
 struct ChangeDir {
-    explicit ChangeDir(const std::string &dir);
-    ~ChangeDir();
-    std::string saved;
+    explicit ChangeDir(const std::string &dir) { std::filesystem::current_path(dir); }
+    ~ChangeDir() { std::filesystem::current_path(saved, ignored); }
+    const std::filesystem::path saved = std::filesystem::current_path();
 };
 
 std::string err(status_code code);         // "err:d3470218"
 std::string describe(status_code result);  // a call's result and the token record
-std::string next();                        // one sc_next_token, described
+inline std::string next() {                // one sc_next_token, described
+    return describe(sc_next_token());
+}
 std::string rest();  // sc_next_token up to the end of input (at most 20000 calls)
 
 // sc_lex_init on construction; sg_closesources and lex_free on destruction.
 struct LexSession {
     LexSession() { sc_lex_init(); }
     ~LexSession() { sg_closesources(), lex_free(); }
-    // Writes main.src and opens it with sc_lex_init_file.
-    status_code open(const std::string &bytes) const {
+    status_code open(const std::string &bytes) const {  // main.src, by sc_lex_init_file
         return sc_lex_init_file(dir.write("main.src", bytes).c_str());
     }
     TempDir dir;
