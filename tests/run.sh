@@ -14,13 +14,10 @@ root=$(pwd)
 jobs=$(nproc 2>/dev/null || echo 2)
 
 need_packages() {
-    local missing=()
-    for p in "$@"; do
-        dpkg -s "$p" >/dev/null 2>&1 || missing+=("$p")
-    done
+    local missing=() p sudo=
+    for p in "$@"; do dpkg -s "$p" >/dev/null 2>&1 || missing+=("$p"); done
     [ ${#missing[@]} -eq 0 ] && return 0
-    local sudo=""
-    [ "$(id -u)" -ne 0 ] && sudo="sudo"
+    [ "$(id -u)" -ne 0 ] && sudo=sudo
     echo "== installing: ${missing[*]}"
     $sudo apt-get update -qq
     DEBIAN_FRONTEND=noninteractive $sudo apt-get install -y -qq --no-install-recommends "${missing[@]}"
@@ -100,9 +97,8 @@ windows_build_and_test() {
         ran="32-bit: compile-time layout checks, export table, unit tests, tool tests, C loader (32-bit Wine)"
         skipped="none"
     else
-        echo "== Windows: it does not ($probe_result): 32-bit Windows programs cannot run;"
-        echo "   the i686 DLL is built and checked without running, and every Windows test"
-        echo "   runs in a 64-bit build under 64-bit Wine"
+        echo "== Windows: it does not ($probe_result): the i686 DLL is built and checked"
+        echo "   without running, and every Windows test runs in a 64-bit build under 64-bit Wine"
         need_packages g++-mingw-w64-i686 g++-mingw-w64-x86-64 googletest wine64
         only_test=windows_dll_interface build_and_test windows32 \
             -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64-i686.cmake"
