@@ -85,7 +85,8 @@ TEST(Directives, Defines) {
     expect_tokens({
         {"#define F\n#define F 2\nF", err(TPLEX_MACRO_REDEFINED) + " def:F:0 eof"},
         {"#define X 1\n#define X 2\nX", err(TPLEX_BAD_HASH_WORD) + " n:2:2 n:1:1 eof"},  // expanded
-        {"#define B 'c' x\nB", "ch:c id:X eof"},
+        {"#define B 'c' x\nB", "ch:c id:X eof"},  // and each name its own body, every time:
+        {"#define A 1\n#define B 2 3\nA B A B", repeat("n:1:1 n:2:2 n:3:3 ", 2) + "eof"},
         {"#define B x 'c'\nB", err(TPLEX_MACRO_BAD_TOKEN) + " id:B eof"},
         {"#define A x A\nA b", repeat("id:X ", 20) + levels + " id:B eof"},
         {chain + "M1 M20", "id:M21 id:M21 eof"}, {chain + "M0 z", levels + " id:Z eof"},
