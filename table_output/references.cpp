@@ -133,11 +133,11 @@ status_code write_relocations(std::uint32_t s, std::uint32_t r) {
         const relocatable &entry = table.relocatables[id - 1];
         if (entry.first_use == nullptr) {
             return fail_id(TPLEX_OUT_UNUSED_REFERENCE,
-                           "sg_TableOutput: relocatable with no references %d\n", id - 1);
+                           "sg_TableOutput: Relocatable with no references %d\n", id - 1);
         }
         if (entry.target == 0) {
             return fail(TPLEX_OUT_UNDEFINED_REFERENCE,
-                        "sg_TableOutput: relocatable with no definition\n");
+                        "sg_TableOutput: Relocatable with no definition\n");
         }
         // Computed wide: a string position far beyond the table must not wrap
         // around to an offset below R.
@@ -145,7 +145,7 @@ status_code write_relocations(std::uint32_t s, std::uint32_t r) {
             entry.string_flag != 0 ? std::uint64_t{s} + entry.target - 1 : entry.target;
         for (const reloc_record *use = entry.first_use; use != nullptr; use = use->next) {
             if (use->offset >= r || target >= r) {
-                return fail(TPLEX_OUT_OUT_OF_RANGE, "sg_TableOutput: relocatable out of range\n");
+                return fail(TPLEX_OUT_OUT_OF_RANGE, "sg_TableOutput: Relocatable out of range\n");
             }
             status_code status = WriteUInt32(use->offset);
             if (status == TPLEX_OK) status = WriteUInt32(static_cast<std::uint32_t>(target));
@@ -218,7 +218,7 @@ status_code OpenOutput(const char *name, uint32_t flags, uint32_t tag) {
     // The file exists before the tables: after these failures it stays, empty.
     if (!tplex::prepare_store()) {
         return tplex::fail(TPLEX_OUT_NO_MEMORY_TABLES,
-                           "sg_TableOutput: Failed to malloc string_store\n");
+                           "sg_TableOutput: Failed to malloc StringStore\n");
     }
     if (!tplex::prepare_relocatables()) {
         return tplex::fail(TPLEX_OUT_NO_MEMORY_TABLES,
@@ -330,7 +330,7 @@ status_code AddToStringStore(uint32_t *out_position, const char *text) {
         tplex::byte_chunk *chunk = tplex::new_chunk();
         if (chunk == nullptr) {
             return tplex::fail(TPLEX_OUT_NO_MEMORY_CHUNK,
-                               "sg_TableOutput (StoreString): Failed to malloc string_store\n");
+                               "sg_TableOutput (StoreString): Failed to malloc StringStore\n");
         }
         if (store.current == nullptr) {
             store.first = chunk;

@@ -6,6 +6,7 @@
 #include <fstream>
 #include <functional>
 #include <string>
+#include <tuple>
 
 #include "base/memory.h"
 #include "base/token.h"
@@ -17,6 +18,8 @@
 namespace tplex::test {
 namespace {
 
+std::string printed;  // on standard error by the last failing step
+
 // For each allocation n that step makes: setup, step with allocation n
 // failing (giving want, unless want is 0), check with failures switched off.
 void walk_failures(const std::function<void()> &setup, const std::function<status_code()> &step,
@@ -25,8 +28,9 @@ void walk_failures(const std::function<void()> &setup, const std::function<statu
     ASSERT_GT(total, 0u);
     for (unsigned long n = 1; n <= total && !::testing::Test::HasFailure(); ++n) {
         SCOPED_TRACE("allocation " + std::to_string(n) + " of " + std::to_string(total));
+        Capture err(2);
         const status_code r = (setup(), mem_fail_at(n), step());
-        mem_fail_at(0);
+        mem_fail_at(0), printed = err.text();
         EXPECT_EQ(r, want == 0 ? r : want);
         check();
     }
@@ -106,23 +110,34 @@ TEST(AllocFailure, Services) {
 
 // A failed OpenOutput leaves no output open (its empty file stays); a failure inside an
 // output closes its file (CloseOutput refuses, AbandonOutput deletes it); memory output stays off.
+// Each failure prints its own message.
 TEST(AllocFailure, TableOutput) {
-    const std::string file = dir.path + "/t.tbl";
-    walk_failures([] { AbandonOutput(1); }, [&] { return OpenOutput(file.c_str(), 0, 7); },
+    const std::string file = dir.path + "/t.tbl", p = "sg_TableOutput";
+    const std::string opening[] = {p + ": Failed to malloc StringStore\n",
+                                   p + ": Failed to malloc relocatables\n"};
+    walk_failures([] { AbandonOutput(1); },
+                  [&] { return OpenOutput(file.c_str(), TPLEX_OUT_DIAGNOSTICS, 7); },
                   TPLEX_OUT_NO_MEMORY_TABLES,
-                  [&] {
+                  [&, n = 0]() mutable {
+                      EXPECT_EQ(printed, opening[n++ % 2]);
                       EXPECT_EQ(AbandonOutput(1), TPLEX_OUT_NOT_OPEN);
                       EXPECT_TRUE(std::ifstream(file).good());
                   });
     std::uint32_t id = 0;
-    const std::string long_text(9999, 's');
-    const std::pair<std::function<status_code()>, status_code> cases[] = {
-        {[&] { return WriteReference(&id, 0); }, TPLEX_OUT_NO_MEMORY_RELOC},
-        {[] { return StoreString("x"); }, TPLEX_OUT_NO_MEMORY_RELOC},
-        {[&] { return AddToStringStore(&id, long_text.c_str()); }, TPLEX_OUT_NO_MEMORY_CHUNK}};
-    for (const auto &[op, code] : cases) {
-        auto open = [&] { AbandonOutput(1), OpenOutput(file.c_str(), 1, 0), StoreString("first"); };
+    const std::string long_text(9999, 's'),
+        reloc = p + " (CreateReference): Failed to malloc reloc record\n";
+    const std::tuple<std::function<status_code()>, status_code, std::string> cases[] = {
+        {[&] { return WriteReference(&id, 0); }, TPLEX_OUT_NO_MEMORY_RELOC, reloc},
+        {[] { return StoreString("x"); }, TPLEX_OUT_NO_MEMORY_RELOC, reloc},
+        {[&] { return AddToStringStore(&id, long_text.c_str()); }, TPLEX_OUT_NO_MEMORY_CHUNK,
+         p + " (StoreString): Failed to malloc StringStore\n"}};
+    for (const auto &[op, code, message] : cases) {
+        auto open = [&] {
+            AbandonOutput(1), OpenOutput(file.c_str(), TPLEX_OUT_ALIGN | TPLEX_OUT_DIAGNOSTICS, 0),
+                StoreString("first");
+        };
         walk_failures(open, op, code, [&] {
+            EXPECT_EQ(printed, message);
             EXPECT_EQ(WriteUInt8(1), TPLEX_OUT_WRITE_FAILED);
             EXPECT_EQ(CloseOutput(), TPLEX_OUT_WRITE_FAILED);
             EXPECT_EQ(AbandonOutput(1), 0);

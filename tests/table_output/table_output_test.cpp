@@ -148,7 +148,7 @@ TEST_F(Output, ReferencesAndStrings) {
 
 // A call on an open output: its code, message (diagnostics on), and whether it closes the file.
 TEST_F(Output, FailureCodesAndMessages) {
-    const std::string p = "sg_TableOutput: ", out_of_range = p + "relocatable out of range\n";
+    const std::string p = "sg_TableOutput: ", out_of_range = p + "Relocatable out of range\n";
     std::uint32_t id = 0, diagnostics = TPLEX_OUT_DIAGNOSTICS;
     // clang-format off
     const std::tuple<std::function<status_code()>, status_code, std::string, bool> cases[] = {
@@ -164,9 +164,9 @@ TEST_F(Output, FailureCodesAndMessages) {
         {[] { return StoreString("s"), table_output.store.total += 3, CloseOutput(); },
          TPLEX_OUT_STRING_TABLE_DAMAGED, p + "String table integrity damaged\n", true},
         {[] { return DefineReferenceHere(nullptr, 0, 0), CloseOutput(); },
-         TPLEX_OUT_UNUSED_REFERENCE, p + "relocatable with no references 0\n", true},
+         TPLEX_OUT_UNUSED_REFERENCE, p + "Relocatable with no references 0\n", true},
         {[] { return WriteReference(nullptr, 0), DefineReference(1, 0), CloseOutput(); },
-         TPLEX_OUT_UNDEFINED_REFERENCE, p + "relocatable with no definition\n", true},
+         TPLEX_OUT_UNDEFINED_REFERENCE, p + "Relocatable with no definition\n", true},
         {[&] { return DefineReferenceHere(&id, 0, 0), CreateReference(id, 9999), CloseOutput(); },
          TPLEX_OUT_OUT_OF_RANGE, out_of_range, true},
         {[&] { AllocateReference(&id), CreateReference(id, 16), WriteUInt32(0);  // no wrap below R
