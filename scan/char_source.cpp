@@ -60,14 +60,6 @@ void point_cursor(cursor_owner owner, int index, const char *base, std::uint32_t
     }
 }
 
-// The frame being read, or null when no file is open (or the depth has been
-// set out of range through the parser's address).
-source_frame *current_frame() {
-    if (source_stack == nullptr || source_depth < 1 || source_depth > max_source_depth)
-        return nullptr;
-    return &source_stack[source_depth];
-}
-
 // The character of a frame's line at its read position; NUL past the line.
 inline std::uint8_t line_char(const source_frame &f) {
     return f.read_pos < line_size ? static_cast<std::uint8_t>(f.line_text[f.read_pos]) : 0;
@@ -100,8 +92,7 @@ void drop_macros() {
 bool next_file_line() {
     if (!cursor_reads_file()) return false;
     source_frame &f = source_stack[cur.index];
-    if (!platform::read_line(f.file, f.line_text, line_size)) return false;
-    ++f.line_no;
+    if (!read_next_line(f)) return false;
     f.read_pos = 0;
     if (f.line_text[0] != '\0') {
         read_cursor = cursor_line;
@@ -143,7 +134,7 @@ std::uint8_t read_char_slow() {
         return c;
     }
 
-    source_frame *f = current_frame();
+    source_frame *f = current_source_frame();
     if (f == nullptr) return ch_end_of_input;
     if (f->line_no == no_line_yet || line_char(*f) == 0) {
         // A file that has no more lines is closed and the includer goes on
@@ -168,7 +159,7 @@ std::uint8_t peek_char_slow() {
         const macro_frame &m = macro_stack[macro_depth - 1];
         return m.read_pos < m.length ? static_cast<std::uint8_t>(m.body[m.read_pos]) : ' ';
     }
-    const source_frame *f = current_frame();
+    const source_frame *f = current_source_frame();
     if (f == nullptr) return ' ';
     const std::uint8_t c = line_char(*f);
     return c != 0 ? c : ' ';

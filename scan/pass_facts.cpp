@@ -26,8 +26,8 @@ void pass_facts_reset() {
 
 void note_region_opened() {
     tplex_place &p = pass_facts.region_places[cond_depth];
-    if (source_stack != nullptr && source_depth >= 1 && source_depth <= max_source_depth) {
-        copy_place(p, source_stack[source_depth]);
+    if (const source_frame *f = current_source_frame()) {
+        copy_place(p, *f);
     } else {
         p.path[0] = '\0';
         p.line = 0;
@@ -40,9 +40,9 @@ void note_block_comment(bool open) {
     if (!open) return;
     c.counted = false;
     // A comment inside a pending body has no line of a file.
-    const bool in_file = macro_depth == 0 && source_stack != nullptr && source_depth >= 1;
-    c.depth = in_file ? source_depth : std::int16_t{0};
-    c.line = in_file ? source_stack[source_depth].line_no + 1u : 0u;
+    const source_frame *f = macro_depth == 0 ? current_source_frame() : nullptr;
+    c.depth = f != nullptr ? source_depth : std::int16_t{0};
+    c.line = f != nullptr ? f->line_no + 1u : 0u;
 }
 
 void note_file_end(const source_frame &f) {

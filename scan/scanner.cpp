@@ -697,9 +697,9 @@ namespace {
 // file's frame holds its read position, so this changes exactly when a
 // character has been read from a file since.
 std::uint64_t file_position() {
-    if (source_stack == nullptr || source_depth < 1 || source_depth > max_source_depth) return 0;
-    const source_frame &f = source_stack[source_depth];
-    return std::uint64_t{f.line_no} << 21 | std::uint64_t(source_depth) << 16 | f.read_pos;
+    const source_frame *f = current_source_frame();
+    if (f == nullptr) return 0;
+    return std::uint64_t{f->line_no} << 21 | std::uint64_t(source_depth) << 16 | f->read_pos;
 }
 
 // In a switched-off region, tokens dropped from bodies are counted from the

@@ -170,8 +170,7 @@ source_frame *pop_source_file() {
     if (f.file != nullptr) platform::close_source(f.file);
     f.file = nullptr;
     --source_depth;
-    if (source_depth < 1 || source_depth > max_source_depth) return nullptr;
-    return &source_stack[source_depth];
+    return current_source_frame();
 }
 
 }  // namespace tplex

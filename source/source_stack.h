@@ -55,6 +55,13 @@ inline bool read_next_line(source_frame &f) {
     ++f.line_no;
     return true;
 }
+// The frame being read, or null when no file is open (or the depth has been
+// set out of range through the parser's address).
+inline source_frame *current_source_frame() {
+    if (source_stack == nullptr || source_depth < 1 || source_depth > max_source_depth)
+        return nullptr;
+    return &source_stack[source_depth];
+}
 // Closes the current frame's file (its end was reached) and returns to the
 // frame below: that frame, or null when no file is left open.
 source_frame *pop_source_file();
