@@ -265,11 +265,12 @@ status_code process_hash_directive() {
     if (push) {
         // A 21st region is refused: the depth stays at 20, so no flag past
         // entry 20 is ever read or written.
-        if (cond_depth >= max_cond_depth)
+        if (cond_depth >= max_cond_depth) {
             result = TPLEX_TOO_MANY_COND_LEVELS;
-        else
+        } else {
             cond_stack[++cond_depth] = flag;
-        note_region_opened();
+            note_region_opened();
+        }
     }
     return result;
 }

@@ -88,6 +88,8 @@ expect 0 '^inc[/\\]open.tpl:3: warning: /\* comment opened here is still open at
 region='warning: #ifdef/#ifndef region still open at the end of input$'
 expect 0 "^main.tpl:2: $region" check main.tpl
 expect 1 '^main.tpl: 0 failures, 3 warnings$' check --strict main.tpl
+printf '#ifdef X\n%.0s' {1..21} >deep.tpl  # a 21st region is refused: the 20th keeps its line
+COUNT=20 expect 1 "^deep.tpl:([1-9]|1[0-9]|20): $region" check deep.tpl
 
 # A failed write of standard output is an I/O error.
 if [ -w /dev/full ] && [ ! "$windows" ]; then
