@@ -160,15 +160,6 @@ void dict_show_definition(const hash_definition &d) {
 
 namespace {
 
-// A found entry describes itself in current_token.
-TPLEX_HOT_INLINE void show_entry(const dict_entry &e, bool text_is_name) {
-    token_record &t = current_token;
-    t.kind = e.kind;
-    if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
-    t.value = e.code;
-    if (e.definition != nullptr) dict_show_definition(*e.definition);
-}
-
 // A padded key is the token's own text, which already reads as the name.
 template <bool padded>
 status_code lookup_key(const char *key, std::size_t n) {
@@ -177,7 +168,7 @@ status_code lookup_key(const char *key, std::size_t n) {
     bool found = false;
     const std::uint16_t s = probe<padded>(key, n, found);
     if (s == no_slot) return TPLEX_DISASTER;
-    if (found) show_entry(*dict_slots[s], padded);
+    if (found) dict_show_entry(*dict_slots[s], padded);
     current_token.slot = s;
     return found ? 1 : 0;
 }

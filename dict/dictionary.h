@@ -92,6 +92,15 @@ static_assert(probe_memo_count == 1u << 11, "probe_memo_for takes 11 bits");
 
 // A found entry's definition, copied into current_token.
 void dict_show_definition(const hash_definition &d);
+// A found entry describes itself in current_token (its text too, unless the
+// text already reads as the name).
+TPLEX_HOT_INLINE void dict_show_entry(const dict_entry &e, bool text_is_name) {
+    token_record &t = current_token;
+    t.kind = e.kind;
+    if (!text_is_name) std::memmove(t.text, e.name, e.length + 1u);
+    t.value = e.code;
+    if (e.definition != nullptr) dict_show_definition(*e.definition);
+}
 // dict_lookup_token's probe, its outcome kept for a short name.
 status_code dict_lookup_token_probe(std::size_t length);
 
@@ -108,10 +117,7 @@ inline status_code dict_lookup_token_key(std::size_t length, std::uint64_t w0, s
         t.has_definition = 0;
         t.slot = m.slot;
         if (m.found == 0) return 0;
-        const dict_entry &e = *dict_slots[m.slot];
-        t.kind = e.kind;
-        t.value = e.code;
-        if (e.definition != nullptr) dict_show_definition(*e.definition);
+        dict_show_entry(*dict_slots[m.slot], true);
         return 1;
     }
     return dict_lookup_token_probe(length);
