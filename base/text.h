@@ -1,6 +1,6 @@
 // Bounded text helpers: every copy into a fixed field goes through these, so
 // nothing is written past a field whatever the source holds. And the one
-// table of digit values.
+// rule of upper case, and the one table of digit values.
 #ifndef TPLEX_BASE_TEXT_H
 #define TPLEX_BASE_TEXT_H
 
@@ -35,6 +35,12 @@ inline std::size_t copy_text(char *field, std::size_t size, const char *text) {
 constexpr bool same_text(const char *a, const char *b) {
     while (*a != '\0' && *a == *b) ++a, ++b;
     return *a == *b;
+}
+
+// Names are case-insensitive for the letters a to z only: their upper-case
+// form. Every other byte stays as it is.
+constexpr char upper_case(char c) {
+    return c >= 'a' && c <= 'z' ? static_cast<char>(c - ('a' - 'A')) : c;
 }
 
 // A character's value as a digit of a base up to 16 (either case), or

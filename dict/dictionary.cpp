@@ -33,10 +33,6 @@ constexpr std::array<std::uint16_t, word_max> hash_weights = make_hash_weights()
 
 constexpr std::uint16_t no_slot = 0xFFFF;
 
-inline char upper(char c) {
-    return (c >= 'a' && c <= 'z') ? static_cast<char>(c - 32) : c;
-}
-
 // The key of a name: its first word_max characters.
 inline std::size_t key_length(const char *name) {
     return text_length(name, word_max);
@@ -200,7 +196,7 @@ std::uint16_t dict_hash(const char *name) {
 }
 
 void dict_upcase(char *name) {
-    for (; *name != '\0'; ++name) *name = upper(*name);
+    for (; *name != '\0'; ++name) *name = upper_case(*name);
 }
 
 status_code dict_lookup(char *name) {

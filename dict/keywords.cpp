@@ -61,7 +61,7 @@ void add_keyword(std::uint8_t kind, std::uint16_t code, char *word, const char *
 // reads them).
 void add_copy(void (*add)(std::uint16_t, char *), std::uint16_t code, const char *word) {
     char copy[32];
-    std::snprintf(copy, sizeof copy, "%s", word);
+    copy_text(copy, sizeof copy, word);
     add(code, copy);
 }
 

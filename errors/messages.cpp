@@ -92,7 +92,7 @@ static_assert(same_text(messages[slot_of(TPLEX_FIELD_NOT_PRESENT)],
 static_assert(slot_of(TPLEX_STATUS(0xD3470200u)) >= slot_count && slot_of(0) >= slot_count,
               "codes below the catalogue wrap past its end");
 
-constexpr const char *heading = "\nTemplate compiler error :\n";
+constexpr char heading[] = "\nTemplate compiler error :\n";
 constexpr const char *close_failed_line = "Error Closing File\n";
 
 // The longest message: the catalogue's, or an unlisted code's.
@@ -105,9 +105,8 @@ constexpr std::size_t longest_message() {
     }
     return longest;
 }
-static_assert(sizeof "\nTemplate compiler error :\n" - 1 + longest_message() +
-                      sizeof "\nFile:     Line: -2147483648\n" - 1 + (path_size - 1) +
-                      (line_size - 1) + 1 <=
+static_assert(sizeof heading - 1 + longest_message() + sizeof "\nFile:     Line: -2147483648\n" -
+                      1 + (path_size - 1) + (line_size - 1) + 1 <=
                   TPLEX_DIAGNOSTIC_SIZE,
               "a diagnostic fits TPLEX_DIAGNOSTIC_SIZE");
 constexpr const char *unlisted_sentence = "Unspecified error. The Parser is now very confused.";

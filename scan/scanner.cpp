@@ -42,7 +42,7 @@ static_assert(classes['f'] == (cc_letter | cc_ident) && classes['7'] == (cc_digi
 
 constexpr std::array<char, 256> make_upper() {
     std::array<char, 256> t{};
-    for (int c = 0; c < 256; ++c) t[c] = static_cast<char>(c >= 'a' && c <= 'z' ? c - 32 : c);
+    for (int c = 0; c < 256; ++c) t[c] = upper_case(static_cast<char>(c));
     return t;
 }
 constexpr std::array<char, 256> upper = make_upper();
