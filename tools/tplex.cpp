@@ -348,11 +348,10 @@ public:
 
     // At the end of input.
     void finish() {
-        tplex_place places[TPLEX_SOURCE_FRAMES + 1];
-        const std::int32_t open = tplex_open_regions(places, TPLEX_SOURCE_FRAMES + 1);
-        for (std::int32_t i = 0; i < open && i <= TPLEX_SOURCE_FRAMES; ++i)
-            add(places[i].path, places[i].line,
-                "#ifdef/#ifndef region still open at the end of input");
+        std::vector<tplex_place> places(static_cast<std::size_t>(tplex_open_regions(nullptr, 0)));
+        tplex_open_regions(places.data(), static_cast<std::int32_t>(places.size()));
+        for (const tplex_place &p : places)
+            add(p.path, p.line, "#ifdef/#ifndef region still open at the end of input");
     }
 
     const std::vector<std::string> &lines() const { return lines_; }
