@@ -529,6 +529,31 @@ std::string literal_text(Rng &rng, size_t length, bool lines) {
     return s;
 }
 
+// A reserved word's case, drawn once out of 100: below lower all lower case,
+// below capital capitalised, below mixed each letter at random, else as given.
+std::string vary_case(std::string s, Rng &rng, unsigned lower, unsigned capital, unsigned mixed) {
+    const unsigned r = rng.below(100);
+    if (r < lower) {
+        for (char &c : s) c = static_cast<char>(c | 0x20);
+    } else if (r < capital) {
+        for (size_t i = 1; i < s.size(); i++) s[i] = static_cast<char>(s[i] | 0x20);
+    } else if (r < mixed) {
+        for (char &c : s)
+            if (rng.percent(50)) c = static_cast<char>(c | 0x20);
+    }
+    return s;
+}
+
+// n hex digits, their letters in lower or in upper case.
+std::string hex_digits(Rng &rng, bool lower, int n) {
+    std::string digits;
+    for (int i = 0; i < n; i++) {
+        char c = "0123456789ABCDEF"[rng.below(16)];
+        digits += lower && c > '9' ? static_cast<char>(c | 0x20) : c;
+    }
+    return digits;
+}
+
 // ---------------------------------------------------------------------------
 // Directive material: names defined with and without bodies.
 
@@ -579,17 +604,7 @@ private:
     // A reserved word written in upper, lower, capitalised or mixed case.
     void kw(const char *word) {
         reserved_code(word);
-        std::string s = word;
-        unsigned r = rng_.below(100);
-        if (r < 15) {
-            for (char &c : s) c = static_cast<char>(c | 0x20);
-        } else if (r < 22) {
-            for (size_t i = 1; i < s.size(); i++) s[i] = static_cast<char>(s[i] | 0x20);
-        } else if (r < 25) {
-            for (char &c : s)
-                if (rng_.percent(50)) c = static_cast<char>(c | 0x20);
-        }
-        w_.word(s);
+        w_.word(vary_case(word, rng_, 15, 22, 25));
     }
 
     void id() {
@@ -617,11 +632,7 @@ private:
                 digits += static_cast<char>('0' + rng_.below(10));
         } else if (r < 910) {
             bool lower = rng_.percent(50);
-            int n = r < 900 ? rng_.range(1, 8) : rng_.range(9, 24);
-            for (int i = 0; i < n; i++) {
-                char c = "0123456789ABCDEF"[rng_.below(16)];
-                digits += lower && c > '9' ? static_cast<char>(c | 0x20) : c;
-            }
+            digits = hex_digits(rng_, lower, r < 900 ? rng_.range(1, 8) : rng_.range(9, 24));
             w_.number(rng_.percent(85) ? "0x" : "0X", digits, 16, negative);
             return;
         } else {
@@ -1421,17 +1432,8 @@ private:
             "GENERATE",    "CHARSTRING", "ENDSTATE",  "ENDDECISION", "SELF",   "OFFSPRING",
             "BOOL",        "XOR",        "NEXTSTATE", "OUTPUT",      "START",  "ENDPROCESS",
             "SIGNALROUTE", "TIMESTAMP",  "DURATION"};
-        std::string s = words[rng_.below(sizeof words / sizeof words[0])];
-        unsigned r = rng_.below(100);
-        if (r < 35) {
-            for (char &c : s) c = static_cast<char>(c | 0x20);
-        } else if (r < 59) {
-            for (size_t i = 1; i < s.size(); i++) s[i] = static_cast<char>(s[i] | 0x20);
-        } else if (r < 60) {
-            for (char &c : s)
-                if (rng_.percent(50)) c = static_cast<char>(c | 0x20);
-        }
-        w_.word(s);
+        const char *word = words[rng_.below(sizeof words / sizeof words[0])];
+        w_.word(vary_case(word, rng_, 35, 59, 60));
     }
 
     void number() {
@@ -1453,11 +1455,7 @@ private:
             w_.number("", digits, 10, negative);
         } else if (r < mix_.dec + mix_.hex) {
             bool lower = rng_.percent(50);
-            int n = is_long ? rng_.range(9, 20) : rng_.range(1, 8);
-            for (int i = 0; i < n; i++) {
-                char c = "0123456789ABCDEF"[rng_.below(16)];
-                digits += lower && c > '9' ? static_cast<char>(c | 0x20) : c;
-            }
+            digits = hex_digits(rng_, lower, is_long ? rng_.range(9, 20) : rng_.range(1, 8));
             w_.number(rng_.percent(85) ? "0x" : "0X", digits, 16, negative);
         } else {
             int n = is_long ? rng_.range(33, 48) : rng_.range(1, 16);
