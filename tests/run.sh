@@ -34,10 +34,9 @@ build_and_test() {  # name, extra cmake options...; only_test=NAME runs that tes
     (cd "$dir" && ctest --output-on-failure -j "$jobs" ${only_test:+-R "^$only_test\$"})
 }
 
-# Whether this host runs 32-bit x86 programs: a three-instruction program
-# that exits with 42, run under a time limit. Some kernels are built without
-# the 32-bit interface, and 32-bit Wine fails there at once ("Exec format
-# error"). TPLEX_NO_32BIT=1 answers no on any host, to try that path.
+# Whether this host runs 32-bit x86 programs (some kernels cannot: 32-bit Wine
+# then fails with "Exec format error"): a three-instruction program that exits
+# with 42, under a time limit. TPLEX_NO_32BIT=1 answers no on any host.
 host_runs_32bit() {
     if [ "${TPLEX_NO_32BIT:-0}" = 1 ]; then
         probe_result="TPLEX_NO_32BIT=1 is set"
@@ -59,9 +58,8 @@ host_runs_32bit() {
 }
 
 # One Wine server for every test program of a build, stopped however this
-# ends. Its services start here, away from ctest: they live as long as the
-# server and would hold a test's output pipe open, so ctest would never
-# finish. WINEPREFIX, WINEARCH and the loader are set by the caller.
+# ends; its services start here, away from ctest, whose output pipes they
+# would hold open. WINEPREFIX, WINEARCH and the loader are the caller's.
 wine_build_and_test() {  # name, wine loader, wineserver, cmake options...
     local name=$1 loader=$2 server=$3; shift 3
     export WINEDEBUG=-all WINEDLLOVERRIDES="mscoree,mshtml="
@@ -75,12 +73,10 @@ wine_build_and_test() {  # name, wine loader, wineserver, cmake options...
     trap - EXIT
 }
 
-# The Windows builds, with the MinGW-w64 cross compilers and GoogleTest's
-# sources built along. Where the host runs 32-bit programs, the i686 DLL's
-# tests and the plain C loader run under 32-bit Wine. Where it cannot, the
-# i686 build still compiles every program (the record layouts are checked
-# at compile time) and its DLL's export table is checked; the same sources
-# are then built for x86-64 and every Windows test runs under 64-bit Wine.
+# The Windows builds (MinGW-w64, GoogleTest built along). Where the host runs
+# 32-bit programs, every Windows test runs under 32-bit Wine. Elsewhere the
+# i686 build is compiled (its layouts are checked at compile time) and its
+# DLL's exports checked, and every test runs in an x86-64 build under wine64.
 windows_build_and_test() {
     local probe_result="" ran skipped
     echo "== Windows: probing whether this host runs 32-bit x86 programs"
@@ -113,9 +109,6 @@ windows_build_and_test() {
     echo "== Windows checks that could not run: $skipped"
 }
 
-# One-way includes (tests/layers.sh), README's word tables as the library
-# holds them (tests/readme_words.sh), .clang-format's layout, .clang-tidy's
-# checks.
 lint() {
     need_packages clang-format clang-tidy
     echo "== lint"

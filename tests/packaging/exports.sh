@@ -5,11 +5,8 @@
 #   exports.sh LIBRARY
 set -u
 lib=$1
-expected=$(cat "$(dirname "$0")/../exports.txt")  # the sixteen, one a line
+expected=$(LC_ALL=C sort "$(dirname "$0")/../exports.txt")  # the sixteen, one a line
 actual=$(nm -D --defined-only "$lib" | awk 'NF == 3 { print $3 }' | LC_ALL=C sort)
-if [ "$actual" != "$(LC_ALL=C sort <<<"$expected")" ]; then
-    echo "FAILED: the dynamic symbols of $lib differ from the sixteen exports:"
-    diff <(LC_ALL=C sort <<<"$expected") <(echo "$actual")
-    exit 1
-fi
+diff <(echo "$expected") <(echo "$actual") ||
+    { echo "FAILED: the dynamic symbols of $lib differ from the sixteen exports"; exit 1; }
 echo "1 passed, 0 failed: $lib defines exactly the sixteen exports"

@@ -4,7 +4,6 @@
  * does, reading the shared records sc_lex_setup hands out. Not linked with
  * the library: the header gives the types, record layouts and TPLEX_CALL.
  * The source has CR LF line ends and ends in 0x1A, then bytes never read.
- *
  *   pass_driver [LIBRARY]      (default: tplex.dll, found beside the program)
  */
 #ifdef _WIN32

@@ -12,9 +12,7 @@ namespace {
 const std::string bad = err(TPLEX_BAD_CHARACTER), bad_digit = err(TPLEX_BAD_DIGIT);
 
 std::string repeat(const std::string &s, int n) {
-    std::string out;
-    while (n-- > 0) out += s;
-    return out;
+    return n > 0 ? s + repeat(s, n - 1) : "";
 }
 
 using Cases = std::vector<std::pair<std::string, std::string>>;  // text, tokens

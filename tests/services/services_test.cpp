@@ -124,13 +124,11 @@ TEST(FileNameParts, SplitDefaultNameAndValidity) {
         {"F.X", "x", "|F.X||F.X"}, {"c", "x", "|c||c"}, {"a.b.c", "c", "|a.b|c|a.b.c"},
         {"c.", "", "|c||c."}, {"a/b\\c", "", "a/b|c||c"}, {"d\\$", "x", "d|$||$"},
         {"$", "0123456789abcdefghij", "|$|0123456789abcde|$"}};
-    // clang-format on
     for (auto [path, ext, parts] : table) EXPECT_EQ(split(path, ext), parts) << path;
     EXPECT_EQ(split(std::string(300, 'd') + "\\n.x", "x"), std::string(199, 'd') + "|n|x|n.x");
     EXPECT_EQ(split("d\\$", "x", "main") + split("d\\c", "x", "main"), "d|main||$d|c||c");
     // file_spec_invalid of dir, name and ext.
     const std::string d100(100, 'd'), n40(40, 'n'), e10(10, 'e');
-    // clang-format off
     const std::string fields[][4] = {  // dir, name, ext, invalid
         {"", "", "", "0"}, {"d", "", "", "1"}, {"a#b\\c/d~-:._ ", "n/a~-:_. 9Z", "e/~-:_. ", "0"},
         {"", "a#b", "", "1"}, {"", "n", "e#", "1"}, {"d$", "n", "", "1"}, {"", "$", "", "1"},

@@ -15,12 +15,9 @@ set(INSTALL_GTEST OFF CACHE BOOL "" FORCE)
 add_subdirectory(${TPLEX_GTEST_SOURCE_DIR} ${CMAKE_BINARY_DIR}/googletest
   EXCLUDE_FROM_ALL SYSTEM)
 
-# tplex_host_command(OUT TARGET): a command that host scripts can run like the
-# program itself (set in OUT). In a cross build it is a generated script that
-# runs the program under the emulator and hands its output back with the
-# text-mode line ends of Windows (CR LF) as LF, so that the same expected
-# texts serve both platforms; a CR that the program itself writes before a
-# line end would still show.
+# tplex_host_command(OUT TARGET): in OUT, a generated script that runs the
+# program under the emulator and hands its output back with Windows' CR LF
+# line ends as LF, so that the same expected texts serve both platforms.
 function(tplex_host_command out target)
   set(script ${CMAKE_BINARY_DIR}/host-run/${target}.sh)
   file(GENERATE OUTPUT ${script} CONTENT "#!/usr/bin/env bash
