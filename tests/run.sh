@@ -38,10 +38,7 @@ build_and_test() {  # name, extra cmake options...; only_test=NAME runs that tes
 # then fails with "Exec format error"): a three-instruction program that exits
 # with 42, under a time limit. TPLEX_NO_32BIT=1 answers no on any host.
 host_runs_32bit() {
-    if [ "${TPLEX_NO_32BIT:-0}" = 1 ]; then
-        probe_result="TPLEX_NO_32BIT=1 is set"
-        return 1
-    fi
+    [ "${TPLEX_NO_32BIT:-0}" = 1 ] && { probe_result="TPLEX_NO_32BIT=1 is set"; return 1; }
     local dir status=0
     dir=$(mktemp -d)
     printf '.globl _start\n_start: movl $1, %%eax\n movl $42, %%ebx\n int $0x80\n' >"$dir/p.s"
@@ -82,10 +79,8 @@ windows_build_and_test() {
     echo "== Windows: probing whether this host runs 32-bit x86 programs"
     if host_runs_32bit; then
         echo "== Windows: it does: the 32-bit DLL's tests run under 32-bit Wine"
-        if ! dpkg --print-foreign-architectures | grep -qx i386; then
-            echo "== adding the i386 architecture (for 32-bit Wine)"
-            dpkg --add-architecture i386
-        fi
+        dpkg --print-foreign-architectures | grep -qx i386 ||
+            { echo "== adding the i386 architecture (for 32-bit Wine)"; dpkg --add-architecture i386; }
         need_packages g++-mingw-w64-i686 googletest wine wine32:i386
         export WINEPREFIX=${TPLEX_WINEPREFIX:-/tmp/tplex-wine-$(id -u)} WINEARCH=win32
         wine_build_and_test windows "$(command -v wine)" "$(command -v wineserver)" \

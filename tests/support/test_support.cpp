@@ -1,5 +1,7 @@
 #include "test_support.h"
 
+#include <gtest/gtest.h>
+
 #include <fstream>
 #include <random>
 #ifdef _WIN32
@@ -30,15 +32,19 @@ std::string TempDir::write(const std::string &name, const std::string &bytes) co
 }
 
 // Into a binary temporary file: the text as written, without text mode's CRs.
-Capture::Capture(int fd) : fd_(fd), saved_(dup(fd)), file_(std::tmpfile()) {
+Capture::Capture(int fd)
+    : fd_(fd), saved_(dup(fd)), file_(std::fopen((dir_.path + "/out").c_str(), "w+b")) {
     std::fflush(fd == 1 ? stdout : stderr);
-    dup2(fileno(file_), fd);
+    EXPECT_NE(file_, nullptr) << "no file to capture into";
+    if (file_ != nullptr) dup2(fileno(file_), fd);
 }
 
 std::string Capture::text() {
-    if (file_ == nullptr) return captured_;
+    if (saved_ < 0) return captured_;
     std::fflush(fd_ == 1 ? stdout : stderr);
-    dup2(saved_, fd_), close(saved_), std::rewind(file_);
+    dup2(saved_, fd_), close(saved_), saved_ = -1;
+    if (file_ == nullptr) return captured_;
+    std::rewind(file_);
     for (int c; (c = std::fgetc(file_)) != EOF;) captured_ += static_cast<char>(c);
     std::fclose(file_), file_ = nullptr;
     return captured_;

@@ -40,6 +40,7 @@ public:
     std::string text();
 
 private:
+    TempDir dir_;  // not tmpfile(): Windows' needs TMP set, and it may not be
     int fd_, saved_;
     std::FILE *file_;
     std::string captured_;
