@@ -97,7 +97,7 @@ bool next_file_line() {
     if (f.line_text[0] != '\0') {
         read_cursor = cursor_line;
     } else {
-        drop_cursor();  // a line that starts with a NUL byte: as read_char_slow has it
+        drop_cursor();  // a line that starts with a NUL byte ends there: the general path goes on
     }
     return true;
 }
@@ -105,21 +105,12 @@ bool next_file_line() {
 std::uint8_t read_char_slow() {
     // The common case first: the file line being read has ended (a valid
     // file cursor means no body is pending and its frame is the current
-    // one) and the file has another line.
-    if (cursor_reads_file()) {
-        source_frame &f = source_stack[cur.index];
-        if (read_next_line(f)) {
-            const auto c = static_cast<std::uint8_t>(f.line_text[0]);
-            if (c != 0) {
-                f.read_pos = 1;
-                read_cursor = cursor_line + 1;
-                return c;
-            }
-            f.read_pos = 0;
-            drop_cursor();
-            return 0;  // a line that starts with a NUL byte
-        }
-        // The file has ended: the general path below closes it.
+    // one) and the file has another line. When the file has ended, the
+    // general path below closes it.
+    if (next_file_line()) {
+        if (!cursor_reads_file()) return 0;  // a line that starts with a NUL byte
+        *cursor_line_pos = 1;
+        return *read_cursor++;
     }
     char_source_sync();
 
