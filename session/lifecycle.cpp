@@ -1,7 +1,6 @@
 #include "session/lifecycle.h"
 
-#include <cstring>
-
+#include "base/text.h"
 #include "dict/dictionary.h"
 #include "dict/keywords.h"
 #include "scan/char_source.h"
@@ -68,8 +67,7 @@ status_code rewind_input() {
     if (source_stack == nullptr) return TPLEX_NOT_INITIALISED;
     lex_reset();
     char main_path[path_size];
-    std::memcpy(main_path, source_stack[1].path, sizeof main_path);
-    main_path[path_size - 1] = '\0';
+    copy_text(main_path, sizeof main_path, source_stack[1].path);
     close_sources();
     return open_source_file(main_path);
 }
