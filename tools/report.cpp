@@ -121,25 +121,6 @@ Diagnostic diagnostic_of(status_code code) {
     return parse_diagnostic(std::string(text, n < sizeof text ? n : sizeof text - 1));
 }
 
-// Printable ASCII as it is, with " and \ escaped, a line feed as \n and
-// every other byte as \xNN.
-void print_quoted(const char *text, std::FILE *out) {
-    std::fputc('"', out);
-    for (const char *p = text; *p != '\0'; ++p) {
-        auto c = static_cast<unsigned char>(*p);
-        if (c == '"' || c == '\\') {
-            std::fprintf(out, "\\%c", c);
-        } else if (c == '\n') {
-            std::fputs("\\n", out);
-        } else if (c < 0x20 || c >= 0x7F) {
-            std::fprintf(out, "\\x%02x", c);
-        } else {
-            std::fputc(c, out);
-        }
-    }
-    std::fputc('"', out);
-}
-
 void print_table_summary(const table_check &c, std::FILE *out) {
     const std::uint32_t header_size = 16;
     std::uint32_t body_end = c.string_offset;
@@ -151,9 +132,8 @@ void print_table_summary(const table_check &c, std::FILE *out) {
     for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
         table_relocation entry = TableRelocationAt(&c, i);
         if (!entry.is_string) continue;
-        std::fprintf(out, "  %u: ", entry.target);
-        print_quoted(TableStringAt(&c, entry.target), out);
-        std::fputc('\n', out);
+        std::fprintf(out, "  %u: %s\n", entry.target,
+                     quoted(TableStringAt(&c, entry.target)).c_str());
     }
     std::fprintf(out, "relocations: %u\n", c.relocation_count);
     for (std::uint32_t i = 0; i < c.relocation_count; ++i) {
