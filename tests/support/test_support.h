@@ -40,7 +40,7 @@ public:
     std::string text();
 
 private:
-    TempDir dir_;  // not tmpfile(): Windows' needs TMP set, and it may not be
+    TempDir dir_;  // not tmpfile(): under Wine it fails now and then beside another program
     int fd_, saved_;
     std::FILE *file_;
     std::string captured_;
