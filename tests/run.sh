@@ -42,16 +42,11 @@ host_runs_32bit() {
     local dir status=0
     dir=$(mktemp -d)
     printf '.globl _start\n_start: movl $1, %%eax\n movl $42, %%ebx\n int $0x80\n' >"$dir/p.s"
-    if ! as --32 -o "$dir/p.o" "$dir/p.s" 2>/dev/null || ! ld -m elf_i386 -o "$dir/p" "$dir/p.o" 2>/dev/null; then
-        rm -rf "$dir"
-        probe_result="no 32-bit x86 program could be linked here to try"
-        return 1
-    fi
+    as --32 -o "$dir/p.o" "$dir/p.s" 2>/dev/null && ld -m elf_i386 -o "$dir/p" "$dir/p.o" 2>/dev/null ||
+        { rm -rf "$dir"; probe_result="no 32-bit x86 program could be linked here to try"; return 1; }
     timeout 10 "$dir/p" </dev/null >/dev/null 2>&1 || status=$?
     rm -rf "$dir"
-    [ "$status" = 42 ] && return 0
-    probe_result="a 32-bit x86 program exits with status $status here, not 42"
-    return 1
+    [ "$status" = 42 ] || { probe_result="a 32-bit x86 program exits with status $status here, not 42"; return 1; }
 }
 
 # One Wine server for every test program of a build, stopped however this
